@@ -68,18 +68,10 @@ bool KQuantized::setValue(double x) noexcept {
   // Saturation is judged on the real input, so a value just above Max is reported even
   // when it would round to MaxQ. Infinities land here too.
   if (x < Min) {
-    valueQ = MinQ;
-    if (VerboseMode) {
-      reportSaturationLow();
-    }
-    return false;
+    return clampLow();
   }
   if (x > Max) {
-    valueQ = MaxQ;
-    if (VerboseMode) {
-      reportSaturationHigh();
-    }
-    return false;
+    return clampHigh();
   }
   // Round half away from zero in double arithmetic (-0.0 counts as non-negative). x lies in
   // [Min, Max], so the rounded value is within one step of the raw range and converts to a

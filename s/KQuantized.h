@@ -55,18 +55,10 @@ class KQuantized {
   // Clamps valueQ into [MinQ, MaxQ]; false when it clamped.
   bool saturate() noexcept {
     if (valueQ > MaxQ) {
-      valueQ = MaxQ;
-      if (VerboseMode) {
-        reportSaturationHigh();
-      }
-      return false;
+      return clampHigh();
     }
     if (valueQ < MinQ) {
-      valueQ = MinQ;
-      if (VerboseMode) {
-        reportSaturationLow();
-      }
-      return false;
+      return clampLow();
     }
     return true;
   }
@@ -224,6 +216,22 @@ class KQuantized {
   static void reportFormat(Who who);
   static void reportSaturationHigh();
   static void reportSaturationLow();
+
+  // valueQ becomes the top (bottom) of the range, with a line in VerboseMode; returns false.
+  bool clampHigh() noexcept {
+    valueQ = MaxQ;
+    if (VerboseMode) {
+      reportSaturationHigh();
+    }
+    return false;
+  }
+  bool clampLow() noexcept {
+    valueQ = MinQ;
+    if (VerboseMode) {
+      reportSaturationLow();
+    }
+    return false;
+  }
 
   // Moves valueQ from oldFracBits fraction bits to the present NFRACBITS. A left shift that
   // would leave 64 bits is replaced by the extreme of the sign, which saturate then clamps.
