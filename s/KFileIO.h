@@ -121,6 +121,19 @@ std::uint64_t hexPattern(T value) {
   }
 }
 
+// Runs build on an empty text; a standard exception is reported and the text formed so far
+// is returned.
+template <typename Build>
+std::string formatGuarded(Build build) {
+  std::string text;
+  try {
+    build(text);
+  } catch (const std::exception& error) {
+    reportException(error);
+  }
+  return text;
+}
+
 }  // namespace fileio_detail
 
 // Binary text of exactly width characters (at most 40). Bit types print 0 or 1; a negative
@@ -128,36 +141,28 @@ std::uint64_t hexPattern(T value) {
 template <typename T>
 std::string toBinary(const T& value, std::uint32_t width) {
   width = fileio_detail::limitBinaryWidth(width);
-  std::string text;
-  try {
+  return fileio_detail::formatGuarded([&](std::string& text) {
     if constexpr (fileio_detail::kIsFormattable<T>) {
       fileio_detail::appendBinary(text, fileio_detail::binaryPattern(value), width);
     } else {
       errorLineBare("Invalid type. Can't print : ", value, " as bin. ");
       text.assign(width, 'x');
     }
-  } catch (const std::exception& error) {
-    fileio_detail::reportException(error);
-  }
-  return text;
+  });
 }
 
 // "0x" and at least width (at most 15) lowercase hexadecimal digits. Bit types print 0 or 1.
 template <typename T>
 std::string toHex(const T& value, std::uint32_t width) {
   width = fileio_detail::limitHexWidth(width);
-  std::string text;
-  try {
+  return fileio_detail::formatGuarded([&](std::string& text) {
     if constexpr (fileio_detail::kIsFormattable<T>) {
       fileio_detail::appendHex(text, fileio_detail::hexPattern(value), width);
     } else {
       errorLineBare("Invalid type. Can't print : ", value, " as hex. ");
       text.assign("0x").append(width, 'x');
     }
-  } catch (const std::exception& error) {
-    fileio_detail::reportException(error);
-  }
-  return text;
+  });
 }
 
 // Record writers. Each appends one record to the descriptor's stream: the comment (each of its
