@@ -3,6 +3,8 @@
 
 #include "errorLine.h"
 
+namespace brannoc {
+
 std::unique_ptr<KCRCGenerator> KCRCGenerator::create(const std::string& properties) {
   if (!properties.empty()) {
     brannoc::errorLineBare("ERROR:KCRCGenerator:Unexpected properties:", properties);
@@ -84,3 +86,5 @@ bool KCRCGenerator::check(const std::vector<std::uint8_t>& codedBits,
   crcPass = (regenerated == codedBits) ? 1 : 0;
   return true;
 }
+
+}  // namespace brannoc

@@ -11,6 +11,8 @@
 #include <string>
 #include <vector>
 
+namespace brannoc {
+
 class KCRCGenerator {
  public:
   // Factory: only the empty properties text is accepted.
@@ -43,5 +45,7 @@ class KCRCGenerator {
   std::vector<std::uint8_t> itsPolynomial;  // entry j: coefficient of x^j, L + 1 entries
   std::uint32_t itsLength = 0;              // L, the number of parity bits
 };
+
+}  // namespace brannoc
 
 #endif  // BRANNOC_KCRCGENERATOR_H

@@ -3,6 +3,8 @@
 
 #include "errorLine.h"
 
+namespace brannoc {
+
 namespace {
 
 constexpr std::uint32_t kMaxCodeBlock = 6144;  // Z of TS 36.212 5.1.2
@@ -93,3 +95,5 @@ bool KDeSegment3GPPLTE::desegment(const std::vector<std::vector<std::uint8_t>>& 
   }
   return true;
 }
+
+}  // namespace brannoc

@@ -13,6 +13,8 @@
 #include <string>
 #include <vector>
 
+namespace brannoc {
+
 struct segmentationParams {
   std::uint32_t TBsize = 0;  // transport-block size in bits, without CRC
   std::uint32_t B = 0;       // TBsize + 24
@@ -55,5 +57,7 @@ class KDeSegment3GPPLTE {
  private:
   segmentationParams itsParams;
 };
+
+}  // namespace brannoc
 
 #endif  // BRANNOC_KDESEGMENT3GPPLTE_H

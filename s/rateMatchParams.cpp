@@ -7,6 +7,8 @@
 
 #include "errorLine.h"
 
+namespace brannoc {
+
 namespace {
 
 constexpr std::string_view kSource = "../s/rateMatchParams.cpp";
@@ -128,3 +130,5 @@ bool rateMatchParams::compute() {
   complete = true;
   return true;
 }
+
+}  // namespace brannoc

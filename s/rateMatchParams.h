@@ -11,6 +11,8 @@
 
 #include "KDeSegment3GPPLTE.h"
 
+namespace brannoc {
+
 struct rateMatchParams {
   bool complete = false;     // the derived fields have been computed at least once
   std::uint32_t G = 0;       // rate-matched data bits (LLRs) of the transport block
@@ -54,5 +56,7 @@ struct rateMatchParams {
   // Derives Eidx, E0, E1, the interleaver rows, Ncb and k0 for both code-block sizes.
   bool compute();
 };
+
+}  // namespace brannoc
 
 #endif  // BRANNOC_RATEMATCHPARAMS_H

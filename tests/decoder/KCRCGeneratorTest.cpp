@@ -8,6 +8,8 @@
 
 namespace {
 
+using brannoc::KCRCGenerator;
+
 using Bits = std::vector<std::uint8_t>;
 
 Bits bitsOfText(const std::string& text) {

@@ -10,6 +10,9 @@
 
 namespace {
 
+using brannoc::KDeSegment3GPPLTE;
+using brannoc::segmentationParams;
+
 struct SegmentationCase {
   std::uint32_t tbSize, B, L, C, Bprime, Kplus, Kminus, Cminus, Cplus, F;
 };

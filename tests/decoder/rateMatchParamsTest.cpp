@@ -10,6 +10,8 @@
 
 namespace {
 
+using brannoc::rateMatchParams;
+
 rateMatchParams configured(std::uint32_t tbSize, std::uint32_t G, std::uint32_t Qm,
                            std::uint32_t rv) {
   rateMatchParams p;
