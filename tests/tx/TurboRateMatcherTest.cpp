@@ -75,7 +75,8 @@ TEST(TurboRateMatcher, SelectsRealBitsFromK0AndWrapsRound) {
       ASSERT_TRUE(rateMatchTurbo(d, E, rv, e));
       ASSERT_EQ(e.size(), E);
       for (std::uint32_t k = 0; k < E; ++k) {
-        ASSERT_EQ(e[k], real[(skipped + k) % real.size()]) << "rv " << rv << " E " << E << " k " << k;
+        ASSERT_EQ(e[k], real[(skipped + k) % real.size()])
+            << "rv " << rv << " E " << E << " k " << k;
       }
     }
   }
