@@ -46,6 +46,9 @@ class KRateDeMatch {
                  std::uint32_t numLayers);
 
   rateMatchParams getRMParams() const { return itsRMParams; }
+  // The parameter set itself, for the owner's setters of the CQI, ACK and RI sizes and
+  // coded lengths (rateMatchParams::setCQISize, setCQIQ, ...).
+  rateMatchParams& rmParams() { return itsRMParams; }
   // 3 * (K_r + 4): the soft values of code block r in the HARQ buffer.
   std::uint32_t getCodeBlockBufferLength(std::uint32_t r) const;
   // E_r: the rate-matched soft values of code block r in this transmission.
