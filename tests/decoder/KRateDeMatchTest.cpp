@@ -6,13 +6,22 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <random>
+#include <sstream>
 #include <cctype>
+#include <cstdlib>
 #include <cstdint>
 #include <functional>
 #include <string>
 #include <vector>
 
+#include "tx/ConvolutionalCode.h"
+#include "tx/TurboEncoder.h"
+#include "tx/TurboRateMatcher.h"
+
 namespace {
+
+namespace tx = brannoc::tx;
 
 using SoftValues = KRateDeMatch::SoftValues;
 using Streams = KRateDeMatch::Streams;
@@ -434,6 +443,188 @@ TEST(KRateDeMatchUci, RefusalsNameTheMissingOrWrongParameter) {
     EXPECT_FALSE(call());
     expectNumberedLine(testing::internal::GetCapturedStderr(),
                        "Need to set RM parameters before calling RM data");
+  }
+}
+
+// Round trips: bits rate-matched by the transmitter, sent as ideal soft values (+A for 1,
+// -A for 0), dematched. Each stream position must come back as A times the number of times
+// it was sent, with the sign of its bit: a misplaced soft value shows as a sign mismatch
+// (random bits), a wrong count as a broken distribution. Over the whole buffer the counts
+// add up to E and differ by at most one (the transmitter reads the circular buffer round and
+// round). With amplitude 100 and E twice the real positions every value saturates.
+struct RoundTripCheck {
+  std::int32_t A;
+  std::uint32_t E;
+  std::uint32_t realPositions;
+  bool saturating;
+};
+
+std::string checkStreams(const std::vector<const tx::Bits*>& sent, const Streams& out,
+                         const RoundTripCheck& c) {
+  std::ostringstream problems;
+  if (out.size() != sent.size()) {
+    return "wrong number of streams";
+  }
+  std::vector<std::uint32_t> histogram(8, 0);
+  std::uint64_t total = 0;
+  int mismatches = 0;
+  for (std::size_t s = 0; s < sent.size(); ++s) {
+    const tx::Bits& bits = *sent[s];
+    if (out[s].size() != bits.size()) {
+      return "stream " + std::to_string(s) + " has " + std::to_string(out[s].size()) +
+             " values for " + std::to_string(bits.size()) + " bits";
+    }
+    for (std::size_t i = 0; i < bits.size(); ++i) {
+      const std::int32_t v = out[s][i];
+      if (bits[i] == tx::kNullBit) {
+        if (v != -128 && mismatches++ < 5) {
+          problems << " filler d" << s << "[" << i << "]=" << v;
+        }
+        continue;
+      }
+      const bool one = bits[i] == 1;
+      if (c.saturating) {
+        if (v != (one ? 127 : -128) && mismatches++ < 5) {
+          problems << " d" << s << "[" << i << "]=" << v;
+        }
+        continue;
+      }
+      const bool signOk = v == 0 || (v > 0) == one;
+      if (!signOk || v % c.A != 0 || std::abs(v / c.A) >= 8) {
+        if (mismatches++ < 5) {
+          problems << " d" << s << "[" << i << "]=" << v << " bit " << int{bits[i]};
+        }
+        continue;
+      }
+      ++histogram[static_cast<std::size_t>(std::abs(v / c.A))];
+      total += static_cast<std::uint64_t>(std::abs(v / c.A));
+    }
+  }
+  if (mismatches > 0) {
+    problems << " (" << mismatches << " wrong values)";
+    return problems.str();
+  }
+  if (c.saturating) {
+    return "";
+  }
+  const std::uint32_t low = c.E / c.realPositions;
+  const std::uint32_t highCount = c.E % c.realPositions;
+  std::vector<std::uint32_t> expected(8, 0);
+  expected[low] = c.realPositions - highCount;
+  if (highCount > 0) {
+    expected[low + 1] = highCount;
+  }
+  if (total != c.E || histogram != expected) {
+    problems << " counts add up to " << total << " for E " << c.E << "; positions sent";
+    for (std::size_t n = 0; n < histogram.size(); ++n) {
+      problems << " " << n << "x:" << histogram[n] << "/" << expected[n];
+    }
+  }
+  return problems.str();
+}
+
+SoftValues idealSoftValues(const tx::Bits& e, std::int32_t A) {
+  SoftValues in(e.size());
+  for (std::size_t m = 0; m < e.size(); ++m) {
+    in[m] = e[m] == 1 ? A : -A;
+  }
+  return in;
+}
+
+// Transmit lengths relative to the real positions of the buffer: half, all, all twice plus
+// a few more, and twice with saturating amplitude.
+struct LengthCase {
+  const char* name;
+  std::uint32_t twice;   // whole passes over the buffer
+  std::uint32_t half;    // 1: add half a pass
+  std::uint32_t extra;   // further positions
+  std::int32_t A;
+};
+constexpr LengthCase kLengths[] = {
+    {"half the buffer", 0, 1, 0, 8},
+    {"the whole buffer", 1, 0, 0, 8},
+    {"two passes and more", 2, 0, 38, 8},
+    {"two passes saturating", 2, 0, 0, 100},
+};
+
+std::uint32_t evenLength(const LengthCase& l, std::uint32_t real) {
+  const std::uint32_t E = l.twice * real + l.half * (real / 2) + l.extra;
+  return E & ~1u;  // QPSK: whole modulation symbols
+}
+
+TEST(KRateDeMatchRoundTrip, TurboCodeBlocksComeBackFromTheTransmitter) {
+  struct Block {
+    std::uint32_t tbSize;
+    std::uint32_t r;
+  };
+  // K 40, K 40 with 8 fillers, 104, 528 (8 fillers), 1056, 2048 (24 fillers), 4032 (8
+  // fillers), 6144, and both blocks of a two-block transport block (K- 3072 with 15
+  // fillers, K+ 3136).
+  const Block blocks[] = {{16, 0},   {8, 0},    {80, 0},   {496, 0},  {1032, 0},
+                          {2000, 0}, {4000, 0}, {6120, 0}, {6121, 0}, {6121, 1}};
+  std::mt19937 random(20240611);
+  for (const Block& block : blocks) {
+    KRateDeMatch rdm;
+    configure(rdm, block.tbSize, 1000);
+    const segmentationParams seg = rdm.getRMParams().seg;
+    const std::uint32_t K = seg.blockSize(block.r);
+    const std::uint32_t F = block.r == 0 ? seg.F : 0;
+    tx::Bits c(K);
+    for (std::uint32_t i = 0; i < K; ++i) {
+      c[i] = i < F ? tx::kNullBit : static_cast<std::uint8_t>(random() & 1u);
+    }
+    tx::TurboCodeword cw;
+    ASSERT_TRUE(tx::turboEncode(c, cw)) << K;
+    const std::uint32_t real = 3 * (K + 4) - 2 * F;
+    for (const LengthCase& length : kLengths) {
+      const std::uint32_t E = evenLength(length, real);
+      for (std::uint32_t rv = 0; rv < 4; ++rv) {
+        SCOPED_TRACE("K " + std::to_string(K) + " F " + std::to_string(F) + " block " +
+                     std::to_string(block.r) + " rv " + std::to_string(rv) + ", " +
+                     length.name + " (E " + std::to_string(E) + ")");
+        configure(rdm, block.tbSize, E * seg.C, 2, rv);
+        ASSERT_EQ(rdm.getCodeBlockE(block.r), E);
+        tx::Bits e;
+        ASSERT_TRUE(tx::rateMatchTurbo(cw, E, rv, e));
+        Streams out;
+        ASSERT_TRUE(rdm.rateDematchData(idealSoftValues(e, length.A), out, block.r));
+        const bool saturating = length.A * static_cast<std::int32_t>(length.twice) > 127;
+        EXPECT_EQ(checkStreams({&cw.d0, &cw.d1, &cw.d2}, out,
+                               {length.A, E, real, saturating}),
+                  "");
+      }
+    }
+  }
+}
+
+TEST(KRateDeMatchRoundTrip, ConvolutionalCqiComesBackFromTheTransmitter) {
+  std::mt19937 random(7);
+  for (std::uint32_t O : {12u, 20u, 24u, 57u, 127u}) {
+    tx::Bits c(O + 8);
+    for (auto& bit : c) {
+      bit = static_cast<std::uint8_t>(random() & 1u);
+    }
+    const tx::ConvolutionalStreams d = tx::encodeTailBiting(c);
+    const std::uint32_t real = 3 * (O + 8);
+    for (const LengthCase& length : kLengths) {
+      // Control fields need not fill whole symbols of this code: keep an odd length too.
+      const std::uint32_t Q = length.twice * real + length.half * (real / 2 + 1) + length.extra;
+      SCOPED_TRACE("O " + std::to_string(O) + ", " + length.name);
+      KRateDeMatch rdm;
+      ASSERT_TRUE(rdm.setModulationParams(Q, 2, 1, 0));
+      ASSERT_TRUE(rdm.rmParams().setCQISize(O));
+      ASSERT_TRUE(rdm.rmParams().setCQIQ(Q));
+      const tx::Bits e = tx::rateMatchConvolutional(d, Q);
+      ASSERT_EQ(e.size(), Q);
+      SoftValues w, d0, d1, d2;
+      ASSERT_TRUE(rdm.rateDematchConv(idealSoftValues(e, length.A), w, d0, d1, d2));
+      const std::uint32_t Kpi = 32 * ((O + 8 + 31) / 32);
+      EXPECT_EQ(w.size(), 3 * Kpi);
+      const bool saturating = length.A * static_cast<std::int32_t>(length.twice) > 127;
+      EXPECT_EQ(checkStreams({&d[0], &d[1], &d[2]}, {d0, d1, d2},
+                             {length.A, Q, real, saturating}),
+                "");
+    }
   }
 }
 
