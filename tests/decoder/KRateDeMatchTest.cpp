@@ -123,22 +123,6 @@ TEST(KRateDeMatchData, RepeatedPositionsAreSummedWithSaturation) {
   }
 }
 
-TEST(KRateDeMatchData, UnvisitedPositionsStayZero) {
-  KRateDeMatch rdm;
-  configure(rdm, kTb40, 66);
-  Streams out;
-  ASSERT_TRUE(rdm.rateDematchData(SoftValues(66, 1), out, 0));
-  int ones = 0, zeros = 0;
-  for (const SoftValues& stream : out) {
-    for (std::int32_t v : stream) {
-      ones += v == 1;
-      zeros += v == 0;
-    }
-  }
-  EXPECT_EQ(ones, 66);
-  EXPECT_EQ(zeros, 66);
-}
-
 TEST(KRateDeMatchData, RefusesBeforeParametersAndWrongInputLength) {
   KRateDeMatch fresh;
   Streams out;
