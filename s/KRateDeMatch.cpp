@@ -8,7 +8,7 @@
 
 #include "errorLine.h"
 
-using brannoc::KQuantized;
+namespace brannoc {
 
 namespace {
 
@@ -76,7 +76,7 @@ bool placeSoftValue(std::vector<std::int32_t>& out, std::int32_t position, std::
                     std::int32_t value) {
   const std::int64_t index = std::int64_t{position} - ND;
   if (index < 0 || index >= static_cast<std::int64_t>(out.size())) {
-    brannoc::errorLineFile(kSource, __LINE__, " interleaver position ", position,
+    errorLineFile(kSource, __LINE__, " interleaver position ", position,
                            " lies outside the stream of ", out.size(),
                            " soft values after ", ND, " dummies");
     return false;
@@ -89,7 +89,7 @@ bool placeSoftValue(std::vector<std::int32_t>& out, std::int32_t position, std::
 
 std::unique_ptr<KRateDeMatch> KRateDeMatch::create(const std::string& properties) {
   if (!properties.empty()) {
-    brannoc::errorLineBare("ERROR:KRateDeMatch:Unexpected properties:", properties);
+    errorLineBare("ERROR:KRateDeMatch:Unexpected properties:", properties);
     return nullptr;
   }
   return std::make_unique<KRateDeMatch>();
@@ -115,7 +115,7 @@ bool KRateDeMatch::setParams(std::uint32_t tbSize, std::uint32_t G, std::uint32_
   // without bits per symbol or layers there is nothing to divide by.
   if (Qm == 0 || numLayers == 0 || !itsRMParams.setDataParams(tbSize, G, 0, Qm, rvIdx,
                                                                numLayers)) {
-    brannoc::errorLineBare("Invalid combination of parameters: tbsize, g, qm, rvidx, nlayers");
+    errorLineBare("Invalid combination of parameters: tbsize, g, qm, rvidx, nlayers");
     return false;
   }
   itsParamsSet = true;
@@ -142,7 +142,7 @@ bool KRateDeMatch::blockGeometry(std::uint32_t r, BlockGeometry& g) const {
   // The interleaver must hold the D_r soft values, and the fillers are part of them; the
   // buffer of three streams must stay addressable by signed 32-bit tables.
   if (Kpi < D || F > D || 3 * Kpi > INT32_MAX) {
-    brannoc::errorLineFile(kSource, __LINE__, " interleaver of ", Kpi,
+    errorLineFile(kSource, __LINE__, " interleaver of ", Kpi,
                            " positions cannot hold ", D, " soft values with ", F, " fillers");
     return false;
   }
@@ -157,19 +157,19 @@ bool KRateDeMatch::blockGeometry(std::uint32_t r, BlockGeometry& g) const {
 bool KRateDeMatch::rateDematchData(const SoftValues& in, Streams& out, std::uint32_t r) {
   out.assign(3, SoftValues());
   if (!itsParamsSet) {
-    brannoc::errorLineBare("Need to set RM parameters before calling RM data");
+    errorLineBare("Need to set RM parameters before calling RM data");
     return false;
   }
   const std::uint32_t E = getCodeBlockE(r);
   if (in.size() != E) {
-    brannoc::errorLineBare("LLR Input Size must be: ", E);
+    errorLineBare("LLR Input Size must be: ", E);
     return false;
   }
   SoftValues nullMap;
   SoftValues P;
   SoftValues pi;
   if (!createInterleavingTables(0, r, nullMap, P, pi)) {
-    brannoc::errorLineBare("Unable to create Interleaving Tables");
+    errorLineBare("Unable to create Interleaving Tables");
     return false;
   }
   const bool minus = r < itsRMParams.seg.Cminus;
@@ -177,11 +177,11 @@ bool KRateDeMatch::rateDematchData(const SoftValues& in, Streams& out, std::uint
   const std::uint32_t Ncb = minus ? itsRMParams.NcbMinus : itsRMParams.NcbPlus;
   SoftValues w;
   if (!llrCollect(in, nullMap, w, k0, Ncb, E)) {
-    brannoc::errorLineBare(" Error in llrCollect");
+    errorLineBare(" Error in llrCollect");
     return false;
   }
   if (!deinterleaveData(w, nullMap, P, pi, out[0], out[1], out[2], r)) {
-    brannoc::errorLineBare(" Error in deinterleaveData");
+    errorLineBare(" Error in deinterleaveData");
     return false;
   }
   return true;
@@ -192,7 +192,7 @@ bool KRateDeMatch::createInterleavingTables(std::uint32_t mode, std::uint32_t r,
                                             SoftValues& pi) const {
   const std::array<std::int32_t, 32>* pattern = columnPattern(mode);
   if (pattern == nullptr) {
-    brannoc::errorLineFile(kSource, __LINE__, " no column permutation for mode ", mode);
+    errorLineFile(kSource, __LINE__, " no column permutation for mode ", mode);
     return false;
   }
   BlockGeometry g;
@@ -236,7 +236,7 @@ bool KRateDeMatch::createConvInterleavingTables(std::uint32_t mode, SoftValues& 
                                                 SoftValues& P) const {
   const std::array<std::int32_t, 32>* pattern = columnPattern(mode);
   if (pattern == nullptr) {
-    brannoc::errorLineFile(kSource, __LINE__, " no column permutation for mode ", mode);
+    errorLineFile(kSource, __LINE__, " no column permutation for mode ", mode);
     return false;
   }
   const ConvGeometry g = convGeometry(itsRMParams.cqiSize);
@@ -266,7 +266,7 @@ bool KRateDeMatch::llrCollect(const SoftValues& in, const SoftValues& nullMap, S
     return true;
   }
   if (Ncb == 0 || nullMap.size() < Ncb || in.size() < E) {
-    brannoc::errorLineFile(kSource, __LINE__, " cannot collect ", E, " soft values from ",
+    errorLineFile(kSource, __LINE__, " cannot collect ", E, " soft values from ",
                            in.size(), " into a buffer of ", Ncb, " with ", nullMap.size(),
                            " marks");
     return false;
@@ -283,7 +283,7 @@ bool KRateDeMatch::llrCollect(const SoftValues& in, const SoftValues& nullMap, S
       ++m;
       skippedInARow = 0;
     } else if (++skippedInARow == Ncb) {
-      brannoc::errorLineFile(kSource, __LINE__, " buffer of ", Ncb,
+      errorLineFile(kSource, __LINE__, " buffer of ", Ncb,
                              " positions holds no real bit");
       return false;
     }
@@ -305,12 +305,12 @@ bool KRateDeMatch::deinterleaveData(const SoftValues& w, const SoftValues& nullM
   d1.assign(D, 0);
   d2.assign(D, 0);
   if (w.size() != 3 * Kpi) {
-    brannoc::errorLineFile(kSource, 276, " llr's size should be:", 3 * Kpi, "  size is:",
+    errorLineFile(kSource, 276, " llr's size should be:", 3 * Kpi, "  size is:",
                            w.size());
     return false;
   }
   if (Kpi < D || nullMap.size() != 3 * Kpi || P.size() != Kpi || pi.size() != Kpi) {
-    brannoc::errorLineFile(kSource, __LINE__, " tables do not fit an interleaver of ", Kpi,
+    errorLineFile(kSource, __LINE__, " tables do not fit an interleaver of ", Kpi,
                            " positions for ", D, " soft values: null map ", nullMap.size(),
                            ", P ", P.size(), ", pi ", pi.size());
     return false;
@@ -330,7 +330,7 @@ bool KRateDeMatch::deinterleaveData(const SoftValues& w, const SoftValues& nullM
     }
     const std::int32_t mark2 = nullMap[p1 + 1];
     if (mark2 == kFiller) {
-      brannoc::errorLineFile(kSource, 331, " No segmentation fillers for p1. ????");
+      errorLineFile(kSource, 331, " No segmentation fillers for p1. ????");
       return false;
     }
     if (mark2 != kDummy && !placeSoftValue(d2, pi[k], ND, w[p1 + 1])) {
@@ -349,7 +349,7 @@ bool KRateDeMatch::applyHARQ(const Streams& harqIn, const Streams& dematched, St
     const std::size_t harqSize = s < harqIn.size() ? harqIn[s].size() : 0;
     const std::size_t dematchedSize = s < dematched.size() ? dematched[s].size() : 0;
     if (harqSize < D || dematchedSize < D) {
-      brannoc::errorLineFile(kSource, __LINE__, " HARQ stream ", s, " size should be at least:",
+      errorLineFile(kSource, __LINE__, " HARQ stream ", s, " size should be at least:",
                              D, "  harq size is:", harqSize, "  dematched size is:",
                              dematchedSize);
       return false;
@@ -368,11 +368,11 @@ bool KRateDeMatch::rateDematchAndHARQ(const SoftValues& in, const Streams& harqI
   out.assign(3, SoftValues());
   Streams dematched;
   if (!rateDematchData(in, dematched, r)) {
-    brannoc::errorLineBare("ERROR PERFORMING RATE DEMATCH");
+    errorLineBare("ERROR PERFORMING RATE DEMATCH");
     return false;
   }
   if (!applyHARQ(harqIn, dematched, out, r)) {
-    brannoc::errorLineBare("ERROR PERFORMING HARQ");
+    errorLineBare("ERROR PERFORMING HARQ");
     return false;
   }
   return true;
@@ -384,27 +384,27 @@ bool KRateDeMatch::rateDematchConv(const SoftValues& in, SoftValues& w, SoftValu
   d1.clear();
   d2.clear();
   if (!itsParamsSet) {
-    brannoc::errorLineBare("Need to set RM parameters before calling RM data");
+    errorLineBare("Need to set RM parameters before calling RM data");
     return false;
   }
   const std::uint32_t Q = itsRMParams.cqiQ;
   if (in.size() != Q) {
-    brannoc::errorLineBare("LLR Input Size must be: ", Q);
+    errorLineBare("LLR Input Size must be: ", Q);
     return false;
   }
   SoftValues nullMap;
   SoftValues P;
   if (!createConvInterleavingTables(1, nullMap, P)) {
-    brannoc::errorLineBare("Unable to create Interleaving Tables");
+    errorLineBare("Unable to create Interleaving Tables");
     return false;
   }
   const auto Ncb = static_cast<std::uint32_t>(3 * P.size());
   if (!llrCollect(in, nullMap, w, 0, Ncb, Q)) {
-    brannoc::errorLineBare(" Error in llrCollect");
+    errorLineBare(" Error in llrCollect");
     return false;
   }
   if (!deinterleaveConvData(w, nullMap, P, d0, d1, d2)) {
-    brannoc::errorLineBare(" Error in deinterleaveData");
+    errorLineBare(" Error in deinterleaveData");
     return false;
   }
   return true;
@@ -419,12 +419,12 @@ bool KRateDeMatch::deinterleaveConvData(const SoftValues& w, const SoftValues& n
   d2.assign(g.D, 0);
   const std::size_t Kpi = g.Kpi;
   if (w.size() != 3 * Kpi) {
-    brannoc::errorLineFile(kSource, 361, " llr's size should be:", 3 * Kpi, "  size is:",
+    errorLineFile(kSource, 361, " llr's size should be:", 3 * Kpi, "  size is:",
                            w.size());
     return false;
   }
   if (nullMap.size() != 3 * Kpi || P.size() != Kpi) {
-    brannoc::errorLineFile(kSource, __LINE__, " tables do not fit an interleaver of ", Kpi,
+    errorLineFile(kSource, __LINE__, " tables do not fit an interleaver of ", Kpi,
                            " positions: null map ", nullMap.size(), ", P ", P.size());
     return false;
   }
@@ -443,33 +443,33 @@ bool KRateDeMatch::deinterleaveConvData(const SoftValues& w, const SoftValues& n
 bool KRateDeMatch::combineAckRi(const SoftValues& softIn, SoftValues& combined, std::uint32_t Q,
                                 std::uint32_t fieldSize, bool isRI) const {
   if (!itsParamsSet) {
-    brannoc::errorLineFile(kSource, __LINE__, "Need to set RM parameters before calling RM data");
+    errorLineFile(kSource, __LINE__, "Need to set RM parameters before calling RM data");
     return false;
   }
   if (Q == 0) {
-    brannoc::errorLineFile(kSource, __LINE__,
+    errorLineFile(kSource, __LINE__,
                            isRI ? "Need to set RI_Q parameter before calling RM data"
                                 : "Need to set ACK_Q parameter before calling RM data");
     return false;
   }
   if (softIn.size() != Q) {
-    brannoc::errorLineFile(kSource, __LINE__,
+    errorLineFile(kSource, __LINE__,
                            isRI ? "RI DataIn size must match RI_Q"
                                 : "ACK DataIn size must match ACK_Q");
     return false;
   }
   if (fieldSize != 1 && fieldSize != 2) {
     if (isRI) {
-      brannoc::errorLineFile(kSource, __LINE__, "RI size must be either 1 or 2 = ", fieldSize);
+      errorLineFile(kSource, __LINE__, "RI size must be either 1 or 2 = ", fieldSize);
     } else {
-      brannoc::errorLineFile(kSource, __LINE__, "ACK size must be either 1 or 2");
+      errorLineFile(kSource, __LINE__, "ACK size must be either 1 or 2");
     }
     return false;
   }
   // One coded block of the field: one modulation symbol for 1 bit, three for 2 bits.
   const std::uint32_t P = fieldSize == 1 ? itsRMParams.Qm : 3 * itsRMParams.Qm;
   if (P == 0) {
-    brannoc::errorLineFile(kSource, __LINE__, " modulation order is 0: no positions to combine on");
+    errorLineFile(kSource, __LINE__, " modulation order is 0: no positions to combine on");
     return false;
   }
   combined.assign(P, 0);
@@ -490,17 +490,17 @@ bool KRateDeMatch::rateDematchACK(const SoftValues& softIn, SoftValues& combined
 
 bool KRateDeMatch::rateDematchCQI(const SoftValues& softIn, SoftValues& combined) const {
   if (!itsParamsSet) {
-    brannoc::errorLineFile(kSource, __LINE__, "Need to set RM parameters before calling RM data");
+    errorLineFile(kSource, __LINE__, "Need to set RM parameters before calling RM data");
     return false;
   }
   const std::uint32_t Q = itsRMParams.cqiQ;
   if (Q == 0) {
-    brannoc::errorLineFile(kSource, __LINE__,
+    errorLineFile(kSource, __LINE__,
                            "Need to set CQI_Q parameter before calling RM data");
     return false;
   }
   if (softIn.size() != Q) {
-    brannoc::errorLineFile(kSource, __LINE__, "CQI DataIn size must match CQI_Q");
+    errorLineFile(kSource, __LINE__, "CQI DataIn size must match CQI_Q");
     return false;
   }
   // The (32, O) block code repeated: every soft value lands on its code position i mod 32.
@@ -512,3 +512,5 @@ bool KRateDeMatch::rateDematchCQI(const SoftValues& softIn, SoftValues& combined
   }
   return true;
 }
+
+}  // namespace brannoc

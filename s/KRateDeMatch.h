@@ -26,6 +26,8 @@
 #include "KQuantized.h"
 #include "rateMatchParams.h"
 
+namespace brannoc {
+
 class KRateDeMatch {
  public:
   using SoftValues = std::vector<std::int32_t>;
@@ -113,8 +115,10 @@ class KRateDeMatch {
 
   bool itsParamsSet;
   rateMatchParams itsRMParams;
-  brannoc::KQuantized itsChaseFormat;  // saturation of repeated soft values in one transmission
-  brannoc::KQuantized itsHarqFormat;   // saturation of the HARQ soft buffer
+  KQuantized itsChaseFormat;  // saturation of repeated soft values in one transmission
+  KQuantized itsHarqFormat;   // saturation of the HARQ soft buffer
 };
+
+}  // namespace brannoc
 
 #endif  // BRANNOC_KRATEDEMATCH_H

@@ -10,6 +10,8 @@
 
 namespace {
 
+using brannoc::KRateDeMatch;
+
 void BM_RateDematchAndHarq6144(benchmark::State& state) {
   constexpr std::uint32_t kTbSize = 6120;
   constexpr std::uint32_t kE = 27660;  // QPSK, 1.5 x the 18444 real buffer positions

@@ -22,6 +22,9 @@
 namespace {
 
 namespace tx = brannoc::tx;
+using brannoc::KRateDeMatch;
+using brannoc::rateMatchParams;
+using brannoc::segmentationParams;
 
 using SoftValues = KRateDeMatch::SoftValues;
 using Streams = KRateDeMatch::Streams;
