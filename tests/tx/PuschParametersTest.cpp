@@ -181,6 +181,8 @@ TEST(PuschParameters, RefusedCombinations) {
        TxStatus::ControlTooLarge},
       {"no data symbol left", [](PuschParameters& p) { p.cqi.codedSymbols = 142; },
        TxStatus::NoRoomForData},
+      {"CQI report beyond the allocation", [](PuschParameters& p) { p.cqiBits = 289; },
+       TxStatus::ControlTooLarge},
       {"control only with a CQI count",
        [](PuschParameters& p) {
          p.tbSize = 0;
