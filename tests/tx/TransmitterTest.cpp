@@ -65,7 +65,8 @@ TEST(PuschTransmitter, ControlBitsSitInTheirCellsAndPlaceholdersAreZero) {
                             const char* field) {
       for (std::uint32_t i = 0; i < q.size() / s.Qm; ++i) {
         const MatrixCell cell = controlSymbolCell(i, f.Rmux, set);
-        const std::size_t first = (static_cast<std::size_t>(cell.column) * f.Rmux + cell.row) * s.Qm;
+        const std::size_t first =
+            (static_cast<std::size_t>(cell.column) * f.Rmux + cell.row) * s.Qm;
         for (std::uint32_t k = 0; k < s.Qm; ++k) {
           ASSERT_EQ(tx.codedBits[first + k], q[i * s.Qm + k]) << s.name << " " << field << i;
         }
