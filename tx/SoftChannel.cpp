@@ -4,7 +4,6 @@
 #include <cmath>
 #include <cstddef>
 
-#include "tx/NoiseSource.h"
 #include "tx/UplinkTypes.h"
 
 namespace brannoc::tx {
@@ -41,10 +40,18 @@ double noiseVarianceFromEsN0Db(double esN0Db) {
 bool makeSoftValues(std::span<const std::uint8_t> bits, Constellation constellation,
                     const ChannelSettings& settings, std::vector<std::int32_t>& soft) {
   soft.clear();
+  GaussianSource noise(settings.seed);
+  return appendSoftValues(bits, constellation, settings, noise, soft);
+}
+
+bool appendSoftValues(std::span<const std::uint8_t> bits, Constellation constellation,
+                      const ChannelSettings& settings, GaussianSource& noise,
+                      std::vector<std::int32_t>& soft) {
   if (!usable(settings)) {
+    soft.clear();
     return false;
   }
-  soft.reserve(bits.size());
+  soft.reserve(soft.size() + bits.size());
   if (settings.mode == ChannelMode::Ideal) {
     for (std::uint8_t bit : bits) {
       soft.push_back(bit == kPlaceholderBit ? 0
@@ -56,7 +63,6 @@ bool makeSoftValues(std::span<const std::uint8_t> bits, Constellation constellat
   std::vector<Symbol> symbols = modulate(bits, constellation);
   const double N0 = noiseVarianceFromEsN0Db(settings.esN0Db);
   const double sigma = std::sqrt(N0 / 2.0);  // per real dimension
-  GaussianSource noise(settings.seed);
   for (Symbol& symbol : symbols) {
     const GaussianSource::Pair n = noise.nextPair();
     symbol.re += sigma * n.first;

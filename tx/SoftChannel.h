@@ -16,6 +16,7 @@
 #include <vector>
 
 #include "tx/Modulation.h"
+#include "tx/NoiseSource.h"
 
 namespace brannoc::tx {
 
@@ -49,6 +50,13 @@ double noiseVarianceFromEsN0Db(double esN0Db);
 // positive finite number).
 bool makeSoftValues(std::span<const std::uint8_t> bits, Constellation constellation,
                     const ChannelSettings& settings, std::vector<std::int32_t>& soft);
+
+// The same, drawing the noise from `noise` (settings.seed unused), so that several parts of
+// one transmission can share a noise sequence. The soft values are appended to `soft`,
+// which is emptied when the settings are unusable.
+bool appendSoftValues(std::span<const std::uint8_t> bits, Constellation constellation,
+                      const ChannelSettings& settings, GaussianSource& noise,
+                      std::vector<std::int32_t>& soft);
 
 }  // namespace brannoc::tx
 
