@@ -286,11 +286,12 @@ void KLTE_CQI_Decoding::decodeBits(const std::vector<std::int32_t>& softBits,
   std::uint32_t bestUnit = 0;
   std::uint32_t bestCandidate = 0;
   bool found = false;
+  // unit = (m >> 1) mod NumPU, kept as a running count (A >= 1, so pairs are complete).
+  std::uint32_t unit = 0;
   for (std::uint32_t m = 0; m < numCandidates; ++m) {
     const std::uint32_t codeword = lowMask[m & ((1U << kLowBits) - 1)] ^ highMask[m >> kLowBits];
     const std::int64_t metric = partial[0][codeword & 0xFF] + partial[1][(codeword >> 8) & 0xFF] +
                                 partial[2][(codeword >> 16) & 0xFF] + partial[3][codeword >> 24];
-    const std::uint32_t unit = (m >> 1) % itsNumPU;
     if (metric > bestMetric) {
       bestMetric = metric;
       bestUnit = unit;
@@ -300,6 +301,9 @@ void KLTE_CQI_Decoding::decodeBits(const std::vector<std::int32_t>& softBits,
       bestUnit = unit;
       bestCandidate = m;
       found = true;
+    }
+    if ((m & 1U) != 0 && ++unit == itsNumPU) {
+      unit = 0;
     }
   }
   if (found) {
