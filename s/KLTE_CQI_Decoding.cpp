@@ -39,6 +39,18 @@ constexpr std::uint32_t kPuschMaxBits = 11;
 static_assert(std::size(kRm20Basis) == kPucchEncodedSize);
 static_assert(std::size(kRm32Basis) == kPuschEncodedSize);
 
+// Column 0 of both basis tables is all ones: every codeword's complement is a codeword.
+template <typename Row, std::size_t Rows>
+constexpr bool firstColumnAllOnes(const Row (&table)[Rows]) {
+  for (const Row& row : table) {
+    if (row.M[0] != 1) {
+      return false;
+    }
+  }
+  return true;
+}
+static_assert(firstColumnAllOnes(kRm20Basis) && firstColumnAllOnes(kRm32Basis));
+
 // The starting best metric; the all-zero and all-one codewords have opposite metrics, so
 // one of them always reaches 0 or more and beats it.
 constexpr std::int64_t kInitialBestMetric = -10000;
@@ -173,23 +185,29 @@ bool KLTE_CQI_Decoding::checkSizes(std::size_t infoSize, std::size_t codeSize,
   return true;
 }
 
+// The type dispatch shared by encode and decode: an unknown type, or wrong sizes followed by
+// the type's "encode Fail" or "decode Fail" line.
+bool KLTE_CQI_Decoding::acceptOperation(std::size_t infoSize, std::size_t codeSize,
+                                        bool decoding) const {
+  if (itsCQIType != CQI_TYPE_PUCCH && itsCQIType != CQI_TYPE_PUSCH) {
+    errorLineFile(kSource, __LINE__, "Error: Incorrect Type Set ", itsCQIType);
+    return false;
+  }
+  if (!checkSizes(infoSize, codeSize, decoding)) {
+    const std::string_view code = itsCQIType == CQI_TYPE_PUCCH ? "PUCCH" : "PUSCH";
+    errorLineFile(kSource, __LINE__, "Error: ", code, " CQI ", decoding ? "decode" : "encode",
+                  " Fail ", itsCQIType);
+    return false;
+  }
+  return true;
+}
+
 bool KLTE_CQI_Decoding::encode(const std::vector<std::uint8_t>& infoBits,
                                std::vector<std::uint8_t>& codeBits) const {
   if (itsNumBits == 0) {
     return true;
   }
-  if (itsCQIType == CQI_TYPE_PUCCH) {
-    if (!checkSizes(infoBits.size(), codeBits.size(), false)) {
-      errorLineFile(kSource, __LINE__, "Error: PUCCH CQI encode Fail ", itsCQIType);
-      return false;
-    }
-  } else if (itsCQIType == CQI_TYPE_PUSCH) {
-    if (!checkSizes(infoBits.size(), codeBits.size(), false)) {
-      errorLineFile(kSource, __LINE__, "Error: PUSCH CQI encode Fail ", itsCQIType);
-      return false;
-    }
-  } else {
-    errorLineFile(kSource, __LINE__, "Error: Incorrect Type Set ", itsCQIType);
+  if (!acceptOperation(infoBits.size(), codeBits.size(), false)) {
     return false;
   }
   encodeBits(infoBits, codeBits);
@@ -201,18 +219,7 @@ bool KLTE_CQI_Decoding::decode(const std::vector<std::int32_t>& softBits,
   if (itsNumBits == 0) {
     return true;
   }
-  if (itsCQIType == CQI_TYPE_PUCCH) {
-    if (!checkSizes(infoBits.size(), softBits.size(), true)) {
-      errorLineFile(kSource, __LINE__, "Error: PUCCH CQI decode Fail ", itsCQIType);
-      return false;
-    }
-  } else if (itsCQIType == CQI_TYPE_PUSCH) {
-    if (!checkSizes(infoBits.size(), softBits.size(), true)) {
-      errorLineFile(kSource, __LINE__, "Error: PUSCH CQI decode Fail ", itsCQIType);
-      return false;
-    }
-  } else {
-    errorLineFile(kSource, __LINE__, "Error: Incorrect Type Set ", itsCQIType);
+  if (!acceptOperation(infoBits.size(), softBits.size(), true)) {
     return false;
   }
   decodeBits(softBits, infoBits);
@@ -286,12 +293,7 @@ void KLTE_CQI_Decoding::decodeBits(const std::vector<std::int32_t>& softBits,
   std::uint32_t bestUnit = 0;
   std::uint32_t bestCandidate = 0;
   bool found = false;
-  // unit = (m >> 1) mod NumPU, kept as a running count (A >= 1, so pairs are complete).
-  std::uint32_t unit = 0;
-  for (std::uint32_t m = 0; m < numCandidates; ++m) {
-    const std::uint32_t codeword = lowMask[m & ((1U << kLowBits) - 1)] ^ highMask[m >> kLowBits];
-    const std::int64_t metric = partial[0][codeword & 0xFF] + partial[1][(codeword >> 8) & 0xFF] +
-                                partial[2][(codeword >> 16) & 0xFF] + partial[3][codeword >> 24];
+  auto consider = [&](std::uint32_t m, std::int64_t metric, std::uint32_t unit) {
     if (metric > bestMetric) {
       bestMetric = metric;
       bestUnit = unit;
@@ -302,7 +304,18 @@ void KLTE_CQI_Decoding::decodeBits(const std::vector<std::int32_t>& softBits,
       bestCandidate = m;
       found = true;
     }
-    if ((m & 1U) != 0 && ++unit == itsNumPU) {
+  };
+  // Candidates go in pairs (m, m + 1) through one unit, unit = (m >> 1) mod NumPU. Message
+  // bit 0 multiplies the all-ones column, so the odd candidate's codeword is the complement
+  // of the even one's and its metric the negative.
+  std::uint32_t unit = 0;
+  for (std::uint32_t m = 0; m < numCandidates; m += 2) {
+    const std::uint32_t codeword = lowMask[m & ((1U << kLowBits) - 1)] ^ highMask[m >> kLowBits];
+    const std::int64_t metric = partial[0][codeword & 0xFF] + partial[1][(codeword >> 8) & 0xFF] +
+                                partial[2][(codeword >> 16) & 0xFF] + partial[3][codeword >> 24];
+    consider(m, metric, unit);
+    consider(m + 1, -metric, unit);
+    if (++unit == itsNumPU) {
       unit = 0;
     }
   }

@@ -45,6 +45,7 @@ class KLTE_CQI_Decoding {
               std::vector<std::uint8_t>& infoBits) const;
 
  private:
+  bool acceptOperation(std::size_t infoSize, std::size_t codeSize, bool decoding) const;
   bool checkSizes(std::size_t infoSize, std::size_t codeSize, bool decoding) const;
   void encodeBits(const std::vector<std::uint8_t>& infoBits,
                   std::vector<std::uint8_t>& codeBits) const;

@@ -2,6 +2,7 @@
 // constraint length 7 convolutional code of TS 36.212 clause 5.1.3.1.
 #include "KLTE_DecoderViterbi.h"
 
+#include <algorithm>
 #include <bit>
 #include <cstdlib>
 #include <fstream>
@@ -239,12 +240,15 @@ bool KLTE_DecoderViterbi::decode(const std::vector<std::int32_t>& q0,
   const bool bestOn = traceEnable && traceOpen(bestStateTrace);
   const bool tracebackOn = traceEnable && traceOpen(tracebackTrace);
 
-  // Code bits (d0 in bit 0, d1 in bit 1, d2 in bit 2) of every branch (state p, input u).
-  std::uint8_t branchBits[kNumStates][2];
-  for (std::uint32_t p = 0; p < kNumStates; ++p) {
-    for (std::uint32_t u = 0; u < 2; ++u) {
-      branchBits[p][u] = static_cast<std::uint8_t>(codeBit(p, u, 0) | (codeBit(p, u, 1) << 1) |
-                                                   (codeBit(p, u, 2) << 2));
+  // Code bits (d0 in bit 0, d1 in bit 1, d2 in bit 2) of the two branches into every state:
+  // from a = 2(e mod 32) and from a + 1, with input bit e / 32.
+  std::uint8_t branchPattern[kNumStates][2];
+  for (std::uint32_t e = 0; e < kNumStates; ++e) {
+    for (std::uint32_t odd = 0; odd < 2; ++odd) {
+      const std::uint32_t p = 2 * (e % 32) + odd;
+      const std::uint32_t u = e / 32;
+      branchPattern[e][odd] = static_cast<std::uint8_t>(codeBit(p, u, 0) | (codeBit(p, u, 1) << 1) |
+                                                        (codeBit(p, u, 2) << 2));
     }
   }
 
@@ -258,8 +262,8 @@ bool KLTE_DecoderViterbi::decode(const std::vector<std::int32_t>& q0,
 
   std::vector<std::uint8_t> survivors(static_cast<std::size_t>(L) * kNumStates);
   std::uint32_t metric[kNumStates] = {};
-  std::uint32_t nextMetric[kNumStates];
-  bool equalCosts[kNumStates];
+  std::uint32_t candA[kNumStates];
+  std::uint32_t candB[kNumStates];
   std::uint32_t normalisationCounter = 0;
   itsPathMetrics.assign(kNumStates, 0);
 
@@ -283,36 +287,31 @@ bool KLTE_DecoderViterbi::decode(const std::vector<std::int32_t>& q0,
       }
 
       // Add-compare-select: target e has predecessors a = 2(e mod 32) and a + 1, both with
-      // input bit e / 32; on equal costs the even predecessor survives.
+      // input bit e / 32; on equal costs the even predecessor survives. Then saturation.
       std::uint8_t* survivor = &survivors[static_cast<std::size_t>(t) * kNumStates];
+      std::uint32_t minMetric = saturation;
       for (std::uint32_t e = 0; e < kNumStates; ++e) {
         const std::uint32_t a = 2 * (e % 32);
-        const std::uint32_t b = a + 1;
-        const std::uint32_t u = e / 32;
-        const std::uint32_t candA = metric[a] + patternCost[branchBits[a][u]];
-        const std::uint32_t candB = metric[b] + patternCost[branchBits[b][u]];
-        if (candB < candA) {
-          nextMetric[e] = candB;
-          survivor[e] = static_cast<std::uint8_t>(b);
-        } else {
-          nextMetric[e] = candA;
-          survivor[e] = static_cast<std::uint8_t>(a);
-        }
-        equalCosts[e] = candA == candB;
-        if (bestOn && equalCosts[e]) {
-          bestStateTrace << (u == 0 ? "A: " : "B: ") << e << " : " << a << " :: ";
+        candA[e] = metric[a] + patternCost[branchPattern[e][0]];
+        candB[e] = metric[a + 1] + patternCost[branchPattern[e][1]];
+      }
+      for (std::uint32_t e = 0; e < kNumStates; ++e) {
+        const bool takeB = candB[e] < candA[e];
+        const std::uint32_t selected = std::min(takeB ? candB[e] : candA[e], saturation - 1);
+        survivor[e] = static_cast<std::uint8_t>(2 * (e % 32) + (takeB ? 1 : 0));
+        metric[e] = selected;
+        minMetric = std::min(minMetric, selected);
+      }
+      if (bestOn) {
+        for (std::uint32_t e = 0; e < kNumStates; ++e) {
+          if (candA[e] == candB[e]) {
+            bestStateTrace << (e < 32 ? "A: " : "B: ") << e << " : " << 2 * (e % 32) << " :: ";
+          }
         }
       }
 
-      // Saturation, then normalisation two steps after all metrics reached the threshold.
-      bool allAbove = true;
-      for (std::uint32_t e = 0; e < kNumStates; ++e) {
-        if (nextMetric[e] >= saturation) {
-          nextMetric[e] = saturation - 1;
-        }
-        metric[e] = nextMetric[e];
-        allAbove = allAbove && metric[e] >= normalisation;
-      }
+      // Normalisation two steps after all metrics reached the threshold.
+      const bool allAbove = minMetric >= normalisation;
       if (allAbove || normalisationCounter > 0) {
         if (++normalisationCounter == 3) {
           for (std::uint32_t& value : metric) {
@@ -337,7 +336,7 @@ bool KLTE_DecoderViterbi::decode(const std::vector<std::int32_t>& q0,
         for (std::uint32_t h = 0; h < kNumStates; ++h) {
           const std::uint32_t state = bitrev6(h);
           bestStateTrace << h << " : " << (survivor[state] & 1U)
-                         << (equalCosts[state] ? " ****\n" : "\n");
+                         << (candA[state] == candB[state] ? " ****\n" : "\n");
         }
       }
     }

@@ -158,6 +158,73 @@ TEST(KLTE_DecoderViterbi, DecodesThroughErasuresAndWeakSoftValues) {
   }
 }
 
+// Metrics never decrease except when normalised; 2^(s+3) is subtracted two steps after the
+// step at which all of them first reached it, also when those steps straddle a chunk end.
+// Ambiguous soft values (7 of 15) make the metrics grow by about 21 every step.
+TEST(KLTE_DecoderViterbi, NormalisationFollowsThresholdByTwoSteps) {
+  struct Case {
+    std::int32_t traceback;
+    std::size_t n;
+    std::uint32_t softBits;
+  };
+  const Case cases[] = {{6, 20, 4}, {96, 135, 4}, {16, 30, 3}};
+  for (const Case& c : cases) {
+    KLTE_DecoderViterbi decoder;
+    ASSERT_TRUE(decoder.setTracebackLength(c.traceback));
+    ASSERT_TRUE(decoder.setNumSoftBits(c.softBits));
+    const std::int32_t middle = (1 << (c.softBits - 1)) - 1;
+    Received rx;
+    for (std::size_t k = 0; k < 3; ++k) {
+      rx.q[k].assign(c.n, middle);
+      rx.e[k].assign(c.n, 0);
+    }
+    Bits decoded(c.n);
+    Extended extended;
+    Traces traces;
+    ASSERT_TRUE(runDecode(decoder, rx, decoded, extended, &traces, true));
+
+    std::vector<std::vector<std::uint32_t>> steps;
+    for (const std::string& line : lines(traces.acs.str())) {
+      if (line.rfind("[Channel Type", 0) == 0) {
+        steps.emplace_back();
+      } else if (line.rfind("[", 0) != 0) {
+        steps.back().push_back(static_cast<std::uint32_t>(std::stoul(line)));
+      }
+    }
+    ASSERT_EQ(steps.size(), extended[0].size());
+    const std::uint32_t threshold = 1U << (c.softBits + 3);
+    std::uint32_t counter = 0;
+    std::uint32_t normalisations = 0;
+    std::uint32_t previousMin = 0;
+    for (std::size_t x = 0; x < steps.size(); ++x) {
+      ASSERT_EQ(steps[x].size(), 64U);
+      const std::uint32_t min = *std::min_element(steps[x].begin(), steps[x].end());
+      EXPECT_LT(*std::max_element(steps[x].begin(), steps[x].end()), 2 * threshold);
+      if (counter > 0 || min >= threshold) {
+        ++counter;
+      }
+      if (counter == 3) {
+        counter = 0;
+        ++normalisations;
+        EXPECT_LT(min, previousMin) << "T " << c.traceback << " step " << x;
+        EXPECT_GE(min + threshold, previousMin) << "T " << c.traceback << " step " << x;
+      } else {
+        EXPECT_GE(min, previousMin) << "T " << c.traceback << " step " << x;
+      }
+      previousMin = min;
+    }
+    EXPECT_GT(normalisations, 2U);
+    // The trace lists state bitrev6(h) in line h.
+    for (std::uint32_t h = 0; h < 64; ++h) {
+      std::uint32_t state = 0;
+      for (std::uint32_t i = 0; i < 6; ++i) {
+        state |= ((h >> i) & 1U) << (5 - i);
+      }
+      EXPECT_EQ(decoder.getPathMetrics()[state], steps.back()[h]) << h;
+    }
+  }
+}
+
 TEST(KLTE_DecoderViterbi, AllErasedDecodesZeros) {
   KLTE_DecoderViterbi decoder;
   Received rx;
