@@ -149,37 +149,18 @@ std::uint32_t KLTE_CQI_Decoding::getEncodedSize() const {
 // size, unlike all the others.
 bool KLTE_CQI_Decoding::checkSizes(std::size_t infoSize, std::size_t codeSize,
                                    bool decoding) const {
-  if (itsCQIType == CQI_TYPE_PUCCH) {
-    if (infoSize != itsNumBits) {
-      errorLineFile(kSource, __LINE__, "Error: PUCCH CQI SrcData Size incorrect ", infoSize,
-                    " Expected ", itsNumBits);
-      return false;
-    }
-    if (codeSize != kPucchEncodedSize) {
-      errorLineFile(kSource, __LINE__, "Error: PUCCH CQI encData Size incorrect ", codeSize,
-                    " Expected ", kPucchEncodedSize);
-      return false;
-    }
-    return true;
-  }
+  const bool pucch = itsCQIType == CQI_TYPE_PUCCH;
+  const std::string_view code = pucch ? "PUCCH" : "PUSCH";
+  const std::string_view gap = !pucch && decoding ? "" : " ";
+  const std::uint32_t encodedSize = pucch ? kPucchEncodedSize : kPuschEncodedSize;
   if (infoSize != itsNumBits) {
-    if (decoding) {
-      errorLineFile(kSource, __LINE__, "Error: PUSCH CQI SrcData Size incorrect", infoSize,
-                    " Expected ", itsNumBits);
-    } else {
-      errorLineFile(kSource, __LINE__, "Error: PUSCH CQI SrcData Size incorrect ", infoSize,
-                    " Expected ", itsNumBits);
-    }
+    errorLineFile(kSource, __LINE__, "Error: ", code, " CQI SrcData Size incorrect", gap, infoSize,
+                  " Expected ", itsNumBits);
     return false;
   }
-  if (codeSize != kPuschEncodedSize) {
-    if (decoding) {
-      errorLineFile(kSource, __LINE__, "Error: PUSCH CQI encData Size incorrect", codeSize,
-                    " Expected ", kPuschEncodedSize);
-    } else {
-      errorLineFile(kSource, __LINE__, "Error: PUSCH CQI encData Size incorrect ", codeSize,
-                    " Expected ", kPuschEncodedSize);
-    }
+  if (codeSize != encodedSize) {
+    errorLineFile(kSource, __LINE__, "Error: ", code, " CQI encData Size incorrect", gap, codeSize,
+                  " Expected ", encodedSize);
     return false;
   }
   return true;
@@ -244,7 +225,7 @@ void KLTE_CQI_Decoding::encodeBits(const std::vector<std::uint8_t>& infoBits,
 // (candidate bit n = bit n of m). The metric of a candidate is the sum of +y_j where its
 // codeword has a 1 and -y_j where it has a 0. Candidates are dealt to the processing units
 // in pairs, unit (m >> 1) mod NumPU; a strictly larger metric wins, and an equal metric wins
-// when it comes from a higher unit (the hardware's final comparison walks the units upward).
+// when it comes from a higher unit.
 //
 // A codeword is held as a mask of code positions, the XOR of the basis columns of the set
 // message bits, taken from two small tables (low six and high seven message bits); its
