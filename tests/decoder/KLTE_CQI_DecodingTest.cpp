@@ -66,21 +66,6 @@ KLTE_CQI_Decoding makeDecoder(std::int32_t type, std::uint32_t numBits, std::uin
   return decoder;
 }
 
-TEST(KLTE_CQI_Decoding, ConstructorsSetTypeBitsAndOneUnit) {
-  const KLTE_CQI_Decoding plain;
-  EXPECT_EQ(plain.getCQIType(), 0U);
-  EXPECT_EQ(plain.getNumBits(), 0U);
-  EXPECT_EQ(plain.getNumPU(), 1U);
-  const KLTE_CQI_Decoding pusch(kPusch, 11);
-  EXPECT_EQ(pusch.getCQIType(), 1U);
-  EXPECT_EQ(pusch.getNumBits(), 11U);
-  EXPECT_EQ(pusch.getEncodedSize(), 32U);
-  EXPECT_EQ(pusch.getMaxNumBits(), 11U);
-  const KLTE_CQI_Decoding pucch(kPucch);
-  EXPECT_EQ(pucch.getEncodedSize(), 20U);
-  EXPECT_EQ(pucch.getMaxNumBits(), 13U);
-}
-
 // Modulo-2 row sums of the basis tables, and column 0 being all ones.
 TEST(KLTE_CQI_Decoding, EncodeGivesStandardCodewords) {
   struct Case {

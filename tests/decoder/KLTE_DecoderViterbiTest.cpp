@@ -88,17 +88,6 @@ void expectErrorLine(const std::string& captured, const std::string& text) {
       << captured;
 }
 
-TEST(KLTE_DecoderViterbi, DefaultsOfTheHardware) {
-  const KLTE_DecoderViterbi decoder;
-  EXPECT_EQ(decoder.getConstraintLength(), 7U);
-  EXPECT_EQ(decoder.getNumOutputs(), 3U);
-  EXPECT_EQ(decoder.getTracebackLength(), 96U);
-  EXPECT_TRUE(decoder.getUseBestState());
-  EXPECT_EQ(decoder.getNumSoftBits(), 4U);
-  EXPECT_FALSE(decoder.getRandomInputDelay());
-  EXPECT_TRUE(decoder.getPathMetrics().empty());
-}
-
 TEST(KLTE_DecoderViterbi, DecodesTransmitterCodewordsOfEveryLengthAtDefaultTraceback) {
   std::mt19937 random(5131);
   KLTE_DecoderViterbi decoder;
