@@ -55,14 +55,6 @@ constexpr std::uint32_t kTb40 = 16;
 // Transport block of 8 bits: K = 40 with F = 8 fillers: 132 - 16 = 116 real positions.
 constexpr std::uint32_t kTb40Fill8 = 8;
 
-TEST(KRateDeMatchFactory, AcceptsOnlyEmptyProperties) {
-  EXPECT_NE(KRateDeMatch::create(""), nullptr);
-  testing::internal::CaptureStderr();
-  EXPECT_EQ(KRateDeMatch::create("fast"), nullptr);
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            "ERROR:KRateDeMatch:Unexpected properties:fast\n");
-}
-
 TEST(KRateDeMatchTables, SmallestBlockHasTwentyDummiesPerStream) {
   KRateDeMatch rdm;
   configure(rdm, kTb40, 132);
