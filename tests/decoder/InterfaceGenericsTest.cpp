@@ -18,7 +18,8 @@ std::string firstCreateMessage(const vexlon_ip_brannoc_generics& generics) {
   vexlon_ip_brannoc_destroy_state(state);
   std::smatch parts;
   if (!std::regex_search(err, parts,
-                         std::regex(R"(^File: \.\./s/brannoc_bitacc_cmodel\.cpp\(\d+\)([^\n]*)\n)"))) {
+                         std::regex(R"(^File: \.\./s/brannoc_bitacc_cmodel\.cpp\(\d+\))"
+                                    R"(([^\n]*)\n)"))) {
     return "<no interface line in: " + err + ">";
   }
   return parts[1].str();
@@ -68,7 +69,8 @@ TEST(Interface, NullArgumentsAreRefusedWithTheirCodes) {
   EXPECT_EQ(vexlon_ip_brannoc_SCH_bitacc_simulate(nullptr, {}, nullptr), 101);
   EXPECT_EQ(vexlon_ip_brannoc_CCH_bitacc_simulate(nullptr, {}, nullptr), 500);
   const std::string err = testing::internal::GetCapturedStderr();
-  EXPECT_NE(err.find(")ERROR:decoder:Simulate called with null state structure\n"), std::string::npos);
+  EXPECT_NE(err.find(")ERROR:decoder:Simulate called with null state structure\n"),
+            std::string::npos);
   EXPECT_NE(err.find(")ERROR:PUCCH decoder:Simulate called with null state structure\n"),
             std::string::npos);
   EXPECT_EQ(IUO_set_debugfn_state(nullptr, 33, 0, "x", 1), 0u);

@@ -151,7 +151,9 @@ TEST(KRateDeMatchData, RefusalsAndInconsistentInputsReportTheirLine) {
        "File: ../s/KRateDeMatch(#)*"},
       {[&] { return rdm.applyHARQ(shortHarq, Streams(3, SoftValues(44)), out, 0); },
        "File: ../s/KRateDeMatch(#) HARQ stream 2*"},
-      {[&] { return rdm.applyHARQ(Streams(2, SoftValues(44)), Streams(3, SoftValues(44)), out, 0); },
+      {[&] {
+         return rdm.applyHARQ(Streams(2, SoftValues(44)), Streams(3, SoftValues(44)), out, 0);
+       },
        "File: ../s/KRateDeMatch(#)*"},
   };
   for (std::size_t i = 0; i < std::size(cases); ++i) {
@@ -297,7 +299,8 @@ TEST(KRateDeMatchRoundTrip, TurboCodeBlocksComeBackFromTheTransmitter) {
     const std::uint32_t real = 3 * (K + 4) - 2 * F;
     for (const LengthCase& length : kLengths) {
       // QPSK: whole modulation symbols.
-      const std::uint32_t E = (length.passes * real + length.half * (real / 2) + length.extra) & ~1u;
+      const std::uint32_t E =
+          (length.passes * real + length.half * (real / 2) + length.extra) & ~1u;
       for (std::uint32_t rv = 0; rv < 4; ++rv) {
         SCOPED_TRACE("K " + std::to_string(K) + " F " + std::to_string(F) + " block " +
                      std::to_string(r) + " rv " + std::to_string(rv) + " E " + std::to_string(E));
