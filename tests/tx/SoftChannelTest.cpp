@@ -27,14 +27,12 @@ TEST(Modulation, ConstellationPointsOfTheStandard) {
     std::uint32_t label;
     double re, im, scale;
   } cases[] = {
-      {qpsk, 0b01, 1, -1, 2},          {qpsk, 0b10, -1, 1, 2},
-      {qam16, 0b0001, 1, 3, 10},       {qam16, 0b0010, 3, 1, 10},
-      {qam16, 0b0111, 3, -3, 10},      {qam16, 0b1101, -1, -3, 10},
-      {qam64, 0b000000, 3, 3, 42},     {qam64, 0b000101, 3, 7, 42},
-      {qam64, 0b001010, 7, 3, 42},     {qam64, 0b100111, -1, 7, 42},
-      {qam64, 0b111111, -7, -7, 42},   {Constellation::PucchBpsk, 1, -1, 0, 1},
-      {pucch, 0b01, 0, -1, 1},         {pucch, 0b10, 0, 1, 1},
-      {pucch, 0b11, -1, 0, 1},
+      {qpsk, 0b01, 1, -1, 2},        {qpsk, 0b10, -1, 1, 2},         {qam16, 0b0001, 1, 3, 10},
+      {qam16, 0b0010, 3, 1, 10},     {qam16, 0b0111, 3, -3, 10},     {qam16, 0b1101, -1, -3, 10},
+      {qam64, 0b000000, 3, 3, 42},   {qam64, 0b000101, 3, 7, 42},    {qam64, 0b001010, 7, 3, 42},
+      {qam64, 0b100111, -1, 7, 42},  {qam64, 0b111111, -7, -7, 42},  {pucch, 0b01, 0, -1, 1},
+      {pucch, 0b10, 0, 1, 1},        {pucch, 0b11, -1, 0, 1},
+      {Constellation::PucchBpsk, 1, -1, 0, 1},
   };
   for (const auto& c : cases) {
     const Symbol s = constellationPoint(c.constellation, c.label);
@@ -65,7 +63,7 @@ TEST(Modulation, UnitEnergyAndGrayNeighbours) {
   }
 }
 
-TEST(NoiseSource, LogExpAndGaussianMoments) {
+TEST(NoiseSource, LogAndExpMatchTheLibraryClosely) {
   for (double x : {1e-300, 3e-17, 0.1, 0.70710678, 0.9999999, 1.0, 1.5, 1e10}) {
     EXPECT_NEAR(deterministicLog(x), std::log(x), 4e-16 * std::fabs(std::log(x)) + 1e-300) << x;
   }
@@ -73,18 +71,6 @@ TEST(NoiseSource, LogExpAndGaussianMoments) {
   for (double x : {-690.0, -2.302585, -0.3, 0.0, 0.2, 6.9, 690.0}) {
     EXPECT_NEAR(deterministicExp(x) / std::exp(x), 1.0, 1e-15) << x;
   }
-  GaussianSource source(12345);
-  const int pairs = 20000;
-  double sum = 0, sumSquares = 0, sumProducts = 0;
-  for (int n = 0; n < pairs; ++n) {
-    const GaussianSource::Pair p = source.nextPair();
-    sum += p.first + p.second;
-    sumSquares += p.first * p.first + p.second * p.second;
-    sumProducts += p.first * p.second;
-  }
-  EXPECT_NEAR(sum / (2 * pairs), 0.0, 0.02);
-  EXPECT_NEAR(sumSquares / (2 * pairs), 1.0, 0.03);
-  EXPECT_NEAR(sumProducts / pairs, 0.0, 0.03);
 }
 
 TEST(SoftChannel, QuantisationTo8Point5) {
@@ -161,17 +147,25 @@ TEST(SoftChannel, SeededRunIsReproducibleOnEveryBuild) {
   EXPECT_NE(soft, otherSeed);
 }
 
-TEST(NoiseSource, SeededSamplesAreBitExactOnEveryBuild) {
+TEST(NoiseSource, SeededSamplesAreBitExactOnEveryBuildAndGaussian) {
   // Quantisation could hide a last-bit difference; the samples themselves must not differ.
   GaussianSource source(7);
   std::uint64_t hash = 0xCBF29CE484222325ull;
-  for (int n = 0; n < 2000; ++n) {
+  const int pairs = 2000;
+  double sum = 0, sumSquares = 0, sumProducts = 0;
+  for (int n = 0; n < pairs; ++n) {
     const GaussianSource::Pair p = source.nextPair();
     for (double sample : {p.first, p.second, deterministicExp(p.first)}) {
       hash = (hash ^ std::bit_cast<std::uint64_t>(sample)) * 0x100000001B3ull;
     }
+    sum += p.first + p.second;
+    sumSquares += p.first * p.first + p.second * p.second;
+    sumProducts += p.first * p.second;
   }
   EXPECT_EQ(hash, 0xde36ee46d8cfcc4dull) << std::hex << hash;
+  EXPECT_NEAR(sum / (2 * pairs), 0.0, 0.05);  // about three standard deviations
+  EXPECT_NEAR(sumSquares / (2 * pairs), 1.0, 0.07);
+  EXPECT_NEAR(sumProducts / pairs, 0.0, 0.07);
 }
 
 }  // namespace
