@@ -69,25 +69,14 @@ TEST(ChannelInterleaver, ControlSymbolsFillTheirColumnsFromTheBottomRow) {
 }
 
 TEST(ChannelInterleaver, RefusesInconsistentLengths) {
-  const struct {
-    const char* name;
-    std::size_t f, cqi, ack, ri;
-    std::uint32_t Qm;
-  } cases[] = {
-      {"odd length for Qm 2", 23, 0, 0, 0, 2},
-      {"partial row", 22, 0, 0, 0, 2},
-      {"Qm 3", 36, 0, 0, 0, 3},
-      {"five rows of ACK in one row", 24, 0, 10, 0, 2},
+  const auto interleave = [](std::size_t f, std::size_t ack, std::uint32_t Qm) {
+    return multiplexAndInterleave(Bits(f, 0), {}, Bits(ack, 1), {}, Qm, CyclicPrefix::Normal);
   };
-  for (const auto& c : cases) {
-    EXPECT_TRUE(multiplexAndInterleave(Bits(c.f, 0), Bits(c.cqi, 0), Bits(c.ack, 0),
-                                       Bits(c.ri, 0), c.Qm, CyclicPrefix::Normal)
-                    .empty())
-        << c.name;
-  }
-  EXPECT_EQ(multiplexAndInterleave(Bits(24, 0), {}, Bits(8, 1), {}, 2, CyclicPrefix::Normal)
-                .size(),
-            24u);
+  EXPECT_TRUE(interleave(23, 0, 2).empty()) << "odd length for Qm 2";
+  EXPECT_TRUE(interleave(22, 0, 2).empty()) << "partial row";
+  EXPECT_TRUE(interleave(36, 0, 3).empty()) << "Qm 3";
+  EXPECT_TRUE(interleave(24, 10, 2).empty()) << "five rows of ACK in one row";
+  EXPECT_EQ(interleave(24, 8, 2).size(), 24u);
 }
 
 }  // namespace

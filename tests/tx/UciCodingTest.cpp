@@ -94,21 +94,17 @@ TEST(TailBiting, RegisterStartsWithTheLastSixBits) {
 TEST(ConvolutionalRateMatching, CollectsTheThreeInterleavedStreamsCircularly) {
   for (std::size_t D : {32u, 20u, 45u}) {
     ConvolutionalStreams d;
+    Bits w;  // each stream's interleaved bits, dummies dropped, in turn
     for (std::size_t i = 0; i < 3; ++i) {
       for (std::size_t k = 0; k < D; ++k) d[i].push_back(((k * 7 + i * 3) % 5) < 2 ? 1 : 0);
-    }
-    const std::uint32_t E = static_cast<std::uint32_t>(3 * D * 2 + 5);
-    const Bits e = rateMatchConvolutional(d, E);
-    ASSERT_EQ(e.size(), E);
-    for (std::size_t k = 0; k + 3 * D < E; ++k) {
-      ASSERT_EQ(e[k], e[k + 3 * D]) << "D=" << D << " period broken at " << k;
-    }
-    for (std::size_t i = 0; i < 3; ++i) {  // each stream's bits, dummies dropped, in turn
-      Bits expected;
       for (std::uint8_t v : subBlockInterleave(d[i], SubBlockPattern::Convolutional)) {
-        if (v != kNullBit) expected.push_back(v);
+        if (v != kNullBit) w.push_back(v);
       }
-      EXPECT_EQ(Bits(e.begin() + i * D, e.begin() + (i + 1) * D), expected) << "D=" << D;
+    }
+    const Bits e = rateMatchConvolutional(d, static_cast<std::uint32_t>(2 * w.size() + 5));
+    ASSERT_EQ(e.size(), 2 * w.size() + 5);
+    for (std::size_t k = 0; k < e.size(); ++k) {
+      ASSERT_EQ(e[k], w[k % w.size()]) << "D=" << D << " k=" << k;
     }
   }
 }
@@ -151,31 +147,29 @@ TEST(AckRiOnPusch, RepetitionAndSimplexPatterns) {
   EXPECT_TRUE(encodeAckRiPusch(Bits{1}, 3, 6).empty());
 }
 
+Bits concat(Bits a, const Bits& b) {
+  a.insert(a.end(), b.begin(), b.end());
+  return a;
+}
+
 TEST(Pucch, CodingByCyclicPrefix) {
-  const Bits cqi13 = bitsOf(0x1ACE, 13);
-  const Bits cqi11 = bitsOf(0x5A3, 11);
-  const Bits ack2 = {1, 0};
-  Bits normal = encodeRm20(cqi13);
-  normal.insert(normal.end(), ack2.begin(), ack2.end());
-  Bits joint = cqi11;
-  joint.insert(joint.end(), ack2.begin(), ack2.end());
+  const Bits cqi13 = bitsOf(0x1ACE, 13), cqi11 = bitsOf(0x5A3, 11), ack2 = {1, 0};
+  const auto normal = CyclicPrefix::Normal, extended = CyclicPrefix::Extended;
   const struct {
     const char* name;
     Bits cqi, ack;
     CyclicPrefix cp;
     Bits expected;  // empty: refused
   } cases[] = {
-      {"normal CP, ACK after the codeword", cqi13, ack2, CyclicPrefix::Normal, normal},
-      {"extended CP, joint coding", cqi11, ack2, CyclicPrefix::Extended, encodeRm20(joint)},
-      {"extended CP without ACK", cqi13, {}, CyclicPrefix::Extended, encodeRm20(cqi13)},
-      {"ACK alone", {}, {0, 1}, CyclicPrefix::Extended, {0, 1}},
-      {"14 CQI bits", bitsOf(1, 14), {}, CyclicPrefix::Normal, {}},
-      {"12 CQI + 2 ACK bits, extended CP", bitsOf(1, 12), ack2, CyclicPrefix::Extended, {}},
-      {"three ACK bits", {}, {1, 1, 1}, CyclicPrefix::Normal, {}},
+      {"normal CP, ACK after the codeword", cqi13, ack2, normal, concat(encodeRm20(cqi13), ack2)},
+      {"extended CP, joint coding", cqi11, ack2, extended, encodeRm20(concat(cqi11, ack2))},
+      {"extended CP without ACK", cqi13, {}, extended, encodeRm20(cqi13)},
+      {"ACK alone", {}, {0, 1}, extended, {0, 1}},
+      {"14 CQI bits", bitsOf(1, 14), {}, normal, {}},
+      {"12 CQI + 2 ACK bits, extended CP", bitsOf(1, 12), ack2, extended, {}},
+      {"three ACK bits", {}, {1, 1, 1}, normal, {}},
   };
-  for (const auto& c : cases) {
-    EXPECT_EQ(encodePucch(c.cqi, c.ack, c.cp), c.expected) << c.name;
-  }
+  for (const auto& c : cases) EXPECT_EQ(encodePucch(c.cqi, c.ack, c.cp), c.expected) << c.name;
 }
 
 }  // namespace
