@@ -19,32 +19,21 @@ Bits patternBits(std::size_t length, std::uint32_t salt) {
   return bits;
 }
 
-struct Scenario {
-  const char* name;
-  std::uint32_t numPrb, Qm;
-  CyclicPrefix cp;
-  std::uint32_t tbSize, cqiBits, ackBits, riBits;
-};
-
 TEST(PuschTransmitter, ControlBitsSitInTheirCellsAndPlaceholdersAreZero) {
-  const Scenario scenarios[] = {
+  const struct {
+    const char* name;
+    std::uint32_t numPrb, Qm;
+    CyclicPrefix cp;
+    std::uint32_t tbSize, cqiBits, ackBits, riBits;
+  } scenarios[] = {
       {"QPSK normal CP, data + all UCI", 2, 2, CyclicPrefix::Normal, 256, 20, 2, 1},
       {"16QAM extended CP, data + ACK", 3, 4, CyclicPrefix::Extended, 1000, 0, 1, 2},
       {"64QAM normal CP, two code blocks", 30, 6, CyclicPrefix::Normal, 8000, 11, 2, 2},
       {"QPSK control only", 1, 2, CyclicPrefix::Normal, 0, 30, 1, 1},
   };
-  for (const Scenario& s : scenarios) {
-    PuschParameters p;
-    p.numPrb = s.numPrb;
-    p.Qm = s.Qm;
-    p.cp = s.cp;
-    p.tbSize = s.tbSize;
-    p.cqiBits = s.cqiBits;
-    p.ackBits = s.ackBits;
-    p.riBits = s.riBits;
-    p.cqi.betaIndex = 8;
-    p.ack.betaIndex = 5;
-    p.ri.betaIndex = 5;
+  for (const auto& s : scenarios) {
+    const PuschParameters p{s.numPrb, s.Qm, s.cp, s.tbSize, 0, s.cqiBits, s.ackBits,
+                            s.riBits, {8, {}}, {5, {}}, {5, {}}, 0, 0};
     const PuschPayload payload = {patternBits(s.tbSize, 1), patternBits(s.cqiBits, 2),
                                   patternBits(s.ackBits, 3), patternBits(s.riBits, 4)};
     ChannelSettings channel;
@@ -55,43 +44,37 @@ TEST(PuschTransmitter, ControlBitsSitInTheirCellsAndPlaceholdersAreZero) {
     const PuschControlFields& f = tx.fields;
     ASSERT_EQ(tx.codedBits.size(), f.totalBits) << s.name;
     ASSERT_EQ(tx.softValues.size(), f.totalBits) << s.name;
-    EXPECT_EQ(tx.f.size(), f.G) << s.name;
-    EXPECT_EQ(tx.qCqi.size(), f.Qcqi) << s.name;
-    EXPECT_EQ(tx.qAck.size(), f.Qack) << s.name;
-    EXPECT_EQ(tx.qRi.size(), f.Qri) << s.name;
+    EXPECT_TRUE(tx.f.size() == f.G && tx.qCqi.size() == f.Qcqi && tx.qAck.size() == f.Qack &&
+                tx.qRi.size() == f.Qri)
+        << s.name << ": field lengths";
 
     // Symbol i of ACK (RI) sits in its cell of the matrix, read out column by column.
-    auto checkControl = [&](const Bits& q, const std::array<std::uint32_t, 4>& set,
-                            const char* field) {
-      for (std::uint32_t i = 0; i < q.size() / s.Qm; ++i) {
+    for (const auto& [q, set] : {std::pair{&tx.qAck, ackColumnSet(s.cp)},
+                                 std::pair{&tx.qRi, riColumnSet(s.cp)}}) {
+      for (std::uint32_t i = 0; i < q->size() / s.Qm; ++i) {
         const MatrixCell cell = controlSymbolCell(i, f.Rmux, set);
-        const std::size_t first =
-            (static_cast<std::size_t>(cell.column) * f.Rmux + cell.row) * s.Qm;
-        for (std::uint32_t k = 0; k < s.Qm; ++k) {
-          ASSERT_EQ(tx.codedBits[first + k], q[i * s.Qm + k]) << s.name << " " << field << i;
-        }
+        const std::size_t first = (std::size_t{cell.column} * f.Rmux + cell.row) * s.Qm;
+        ASSERT_EQ(Bits(tx.codedBits.begin() + first, tx.codedBits.begin() + first + s.Qm),
+                  Bits(q->begin() + i * s.Qm, q->begin() + (i + 1) * s.Qm))
+            << s.name << (q == &tx.qAck ? " ACK" : " RI") << " symbol " << i;
       }
-    };
-    checkControl(tx.qAck, ackColumnSet(s.cp), "ACK symbol ");
-    checkControl(tx.qRi, riColumnSet(s.cp), "RI symbol ");
+    }
 
     std::size_t placeholders = 0;
     for (std::size_t n = 0; n < tx.codedBits.size(); ++n) {
       const std::uint8_t bit = tx.codedBits[n];
-      const std::int32_t expected = bit == kPlaceholderBit ? 0 : bit == 1 ? 40 : -40;
-      ASSERT_EQ(tx.softValues[n], expected) << s.name << " position " << n;
+      ASSERT_EQ(tx.softValues[n], bit == kPlaceholderBit ? 0 : bit == 1 ? 40 : -40)
+          << s.name << " position " << n;
       placeholders += bit == kPlaceholderBit;
     }
     // x placeholders come from ACK and RI only: Qm - 2 of every Qm bits for one-bit
     // fields, 3 (Qm - 2) of every 3 Qm bits for two-bit fields.
-    const std::size_t expectedPlaceholders = (f.Qack + f.Qri) / s.Qm * (s.Qm - 2);
-    EXPECT_EQ(placeholders, expectedPlaceholders) << s.name;
+    EXPECT_EQ(placeholders, (f.Qack + f.Qri) / s.Qm * (s.Qm - 2)) << s.name;
   }
 }
 
 TEST(PuschTransmitter, RefusesPayloadsThatDoNotMatch) {
   PuschParameters p;
-  p.numPrb = 1;
   p.tbSize = 100;
   p.ackBits = 1;
   PuschTransmission tx;
@@ -101,42 +84,34 @@ TEST(PuschTransmitter, RefusesPayloadsThatDoNotMatch) {
   EXPECT_TRUE(tx.codedBits.empty());
   EXPECT_EQ(transmitPusch(p, {Bits(100, 2), {}, {1}, {}}, {}, tx).status,
             TxStatus::InvalidParameter);
-  ChannelSettings bad;
-  bad.mode = ChannelMode::Awgn;
-  bad.llrScale = 0.0;
-  EXPECT_EQ(transmitPusch(p, {Bits(100, 0), {}, {1}, {}}, bad, tx).status,
-            TxStatus::InvalidParameter);
   EXPECT_TRUE(transmitPusch(p, {Bits(100, 0), {}, {1}, {}}, {}, tx).ok());
 }
 
 TEST(PucchTransmitter, CodedBitsAndSoftValues) {
   const Bits cqi = patternBits(10, 5);
-  const Bits ack = {1, 0};
-  ChannelSettings channel;
   PucchTransmission tx;
-  ASSERT_TRUE(transmitPucch(cqi, ack, CyclicPrefix::Normal, channel, tx).ok());
-  ASSERT_EQ(tx.codedBits.size(), 22u);
-  EXPECT_EQ(Bits(tx.codedBits.begin(), tx.codedBits.begin() + 20), encodeRm20(cqi));
+  ASSERT_TRUE(transmitPucch(cqi, Bits{1, 0}, CyclicPrefix::Normal, {}, tx).ok());
+  Bits expected = encodeRm20(cqi);
+  expected.insert(expected.end(), {1, 0});
+  EXPECT_EQ(tx.codedBits, expected);
   EXPECT_EQ(tx.softValues[20], 64);
   EXPECT_EQ(tx.softValues[21], -64);
 
-  channel.mode = ChannelMode::Awgn;
-  channel.esN0Db = 25.0;
-  channel.llrScale = 0.02;
-  for (const Bits& ackBits : {Bits{}, Bits{1}, Bits{0, 1}}) {
-    ASSERT_TRUE(transmitPucch(cqi, ackBits, CyclicPrefix::Normal, channel, tx).ok());
-    ASSERT_EQ(tx.softValues.size(), 20 + ackBits.size());
-    for (std::size_t n = 0; n < tx.codedBits.size(); ++n) {
-      EXPECT_EQ(tx.softValues[n] > 0, tx.codedBits[n] == 1) << n;
-    }
-    ASSERT_TRUE(transmitPucch({}, ackBits.empty() ? Bits{1} : ackBits, CyclicPrefix::Extended,
-                              channel, tx)
-                    .ok());
-    for (std::size_t n = 0; n < tx.codedBits.size(); ++n) {
-      EXPECT_EQ(tx.softValues[n] > 0, tx.codedBits[n] == 1) << "ACK alone " << n;
+  const ChannelSettings channel{ChannelMode::Awgn, 64, 25.0, 1, 0.02};
+  for (const Bits& ack : {Bits{}, Bits{1}, Bits{0, 1}}) {
+    for (CyclicPrefix cp : {CyclicPrefix::Normal, CyclicPrefix::Extended}) {
+      // Extended CP: ACK alone (formats 1a/1b).
+      ASSERT_TRUE(transmitPucch(cp == CyclicPrefix::Normal ? cqi : Bits{},
+                                ack.empty() ? Bits{1} : ack, cp, channel, tx)
+                      .ok());
+      ASSERT_EQ(tx.softValues.size(), tx.codedBits.size());
+      for (std::size_t n = 0; n < tx.codedBits.size(); ++n) {
+        EXPECT_EQ(tx.softValues[n] > 0, tx.codedBits[n] == 1) << n;
+      }
     }
   }
-  EXPECT_EQ(transmitPucch(patternBits(12, 1), ack, CyclicPrefix::Extended, channel, tx).status,
+  EXPECT_EQ(transmitPucch(patternBits(12, 1), Bits{1, 0}, CyclicPrefix::Extended, channel, tx)
+                .status,
             TxStatus::InvalidParameter);
   EXPECT_TRUE(tx.codedBits.empty());
 }
