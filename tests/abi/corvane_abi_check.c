@@ -2,23 +2,10 @@
    32-bit build has 4-byte pointers), then links and calls the library. The expected offsets
    are written out by hand from the word tables, not derived from the header. Exits
    non-zero on the first mismatch, after printing it. */
-#include <stddef.h>
 #include <stdio.h>
 
+#include "abi_expect.h"
 #include "vexlon_ip_corvane_bitacc_cmodel.h"
-
-static int failures = 0;
-
-static void expect(const char *what, size_t actual, size_t expected32, size_t expected64) {
-  size_t expected = sizeof(void *) == 4 ? expected32 : expected64;
-  if (actual != expected) {
-    printf("ABI mismatch: %s is %zu, expected %zu\n", what, actual, expected);
-    ++failures;
-  }
-}
-
-#define FIELD(type, field, at32, at64) expect(#type "." #field, offsetof(type, field), at32, at64)
-#define SIZE(type, size32, size64) expect("sizeof " #type, sizeof(type), size32, size64)
 
 static void check_generics(void) {
   SIZE(vexlon_ip_corvane_generics, 76, 76);
@@ -59,17 +46,17 @@ static void check_calls(void) {
   if (generics.processing_units != 2 || generics.algorithm != 1 ||
       generics.max_block_size != 6144 || generics.extrinsic_bits != 10) {
     printf("default generics are wrong\n");
-    ++failures;
+    ++abi_failures;
   }
   state = vexlon_ip_corvane_create_state(generics);
   if (state == NULL || vexlon_ip_corvane_destroy_state(state) != 0) {
     printf("the default generics give no state\n");
-    ++failures;
+    ++abi_failures;
   }
   generics.processing_units = 3;
   if (vexlon_ip_corvane_create_state(generics) != NULL) {
     printf("create_state accepted 3 processing units\n");
-    ++failures;
+    ++abi_failures;
   }
 }
 
@@ -79,6 +66,6 @@ int main(void) {
   check_outputs();
   check_calls();
   printf("%d-bit corvane ABI check: %s\n", (int)(8 * sizeof(void *)),
-         failures == 0 ? "passed" : "FAILED");
-  return failures == 0 ? 0 : 1;
+         abi_failures == 0 ? "passed" : "FAILED");
+  return abi_failures == 0 ? 0 : 1;
 }
