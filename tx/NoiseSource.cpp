@@ -9,6 +9,10 @@ namespace brannoc::tx {
 
 namespace {
 
+// ln 2 split in two (Cody and Waite): kLn2Hi has its low mantissa bits zero, so n * kLn2Hi is
+// exact for the exponents met here, and kLn2Lo carries the rest.
+constexpr double kLn2Hi = 6.93147180369123816490e-01;
+constexpr double kLn2Lo = 1.90821492927058770002e-10;
 constexpr double kLn2 = 0.6931471805599453094172321;
 constexpr double kSqrtHalf = 0.7071067811865475244008444;
 
@@ -59,14 +63,14 @@ double deterministicLog(double x) {
   for (int k = 23; k >= 1; k -= 2) {  // f2^11 < 1e-16: the terms beyond do not count
     series = series * f2 + 1.0 / k;
   }
-  return exponent * kLn2 + 2.0 * f * series;
+  return exponent * kLn2Hi + (exponent * kLn2Lo + 2.0 * f * series);
 }
 
 double deterministicExp(double x) {
   // x = n ln2 + r, |r| <= ln2 / 2; e^r by its Taylor series (r^18 / 18! < 1e-17).
   const double scaled = x / kLn2;
   const int n = static_cast<int>(scaled < 0.0 ? scaled - 0.5 : scaled + 0.5);
-  const double r = x - n * kLn2;
+  const double r = (x - n * kLn2Hi) - n * kLn2Lo;
   double series = 1.0;
   for (int k = 18; k >= 1; --k) {
     series = 1.0 + series * r / k;

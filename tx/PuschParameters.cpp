@@ -150,6 +150,11 @@ TxOutcome derivePuschControlFields(const PuschParameters& p, PuschControlFields&
   out.contentMask = (p.tbSize > 0 ? 1u : 0u) | (p.cqiBits > 0 ? 2u : 0u) |
                     (p.ackBits > 0 ? 4u : 0u) | (p.riBits > 0 ? 8u : 0u);
   const std::uint64_t symbols = static_cast<std::uint64_t>(out.Msc) * out.Cmux;  // M_sc N_symb
+  if (p.cqiBits > symbols * p.Qm) {
+    return txFailure(TxStatus::ControlTooLarge,
+                     "a CQI report of " + std::to_string(p.cqiBits) + " bits exceeds the " +
+                         std::to_string(symbols * p.Qm) + " coded bits of the allocation");
+  }
   const std::uint64_t ackRiCap = 4ull * out.Msc;
   const std::uint32_t cqiCrcBits = p.cqiBits > kCqiBlockCodeMaxBits ? kCqiCrcBits : 0;
 

@@ -18,8 +18,9 @@ std::span<const QppParameters> qppTable() { return kQppTable; }
 
 const QppParameters* findQpp(std::uint32_t K) {
   const auto* end = std::end(kQppTable);
-  const auto* row = std::lower_bound(std::begin(kQppTable), end, K,
-                                     [](const QppParameters& r, std::uint32_t k) { return r.K < k; });
+  const auto* row = std::lower_bound(
+      std::begin(kQppTable), end, K,
+      [](const QppParameters& r, std::uint32_t k) { return r.K < k; });
   return (row != end && row->K == K) ? row : nullptr;
 }
 

@@ -35,12 +35,7 @@ TEST(Crc, ParityOfSingleOneBitIsThePolynomial) {
     EXPECT_EQ(crcParity(one, c.type), bitsOf(c.taps, c.length)) << c.length;
   }
   EXPECT_EQ(crcParity(Bits{1}, CrcType::Crc8), (Bits{1, 0, 0, 1, 1, 0, 1, 1}));
-}
-
-TEST(Crc, AllZeroMessageHasZeroParity) {
-  const Bits zeros(100, 0);
-  EXPECT_EQ(crcParity(zeros, CrcType::Crc24A), Bits(24, 0));
-  EXPECT_EQ(crcParity(Bits{}, CrcType::Crc16), Bits(16, 0));
+  EXPECT_EQ(crcParity(Bits(100, 0), CrcType::Crc24A), Bits(24, 0));
 }
 
 TEST(Crc, Crc16MatchesTheZeroStartCheckValue) {
@@ -69,12 +64,6 @@ TEST(Crc, AttachedParityLeavesZeroRemainder) {
       EXPECT_NE(crcParity(damaged, type), Bits(crcLength(type), 0));
     }
   }
-}
-
-TEST(Crc, NullFillerBitsCountAsZero) {
-  const Bits withFiller{kNullBit, kNullBit, 1, 0, 1};
-  const Bits withZeros{0, 0, 1, 0, 1};
-  EXPECT_EQ(crcParity(withFiller, CrcType::Crc24B), crcParity(withZeros, CrcType::Crc24B));
 }
 
 }  // namespace

@@ -31,24 +31,35 @@ Bits numbered(std::uint32_t D) {
   return d;
 }
 
-TEST(SubBlockInterleaver, FortyFourBitsGiveTwoRowsAndTwentyDummies) {
-  // K = 40: D = 44, R = 2, Kpi = 64, ND = 20. Output k reads y[P(k/2) + 32(k%2)].
-  const Bits d = numbered(44);
-  const Bits v = subBlockInterleave(d, SubBlockPattern::Turbo);
-  ASSERT_EQ(v.size(), 64u);
-  EXPECT_EQ(v[0], kNullBit);   // y0
-  EXPECT_EQ(v[1], d[32 - 20]); // y32
-  EXPECT_EQ(v[2], kNullBit);   // y16
-  EXPECT_EQ(v[3], d[48 - 20]); // y48
-  EXPECT_EQ(v[63], d[63 - 20]);
-  EXPECT_EQ(std::count(v.begin(), v.end(), kNullBit), 20);
-  // The third stream reads one position further, wrapping at Kpi: v2[63] = y0.
-  const Bits v2 = subBlockInterleave(d, SubBlockPattern::Turbo, true);
-  EXPECT_EQ(v2[0], kNullBit);   // y1
-  EXPECT_EQ(v2[1], d[33 - 20]); // y33
-  EXPECT_EQ(v2[62], d[32 - 20]); // y(31 + 1)
-  EXPECT_EQ(v2[63], kNullBit);  // y64 mod 64 = y0
-  EXPECT_EQ(std::count(v2.begin(), v2.end(), kNullBit), 20);
+TEST(SubBlockInterleaver, OutputsReadTheWorkedInputPositions) {
+  // D = 44 (K = 40): R = 2, Kpi = 64, ND = 20, v_k = y[P(k/2) + 32(k%2)]; the third turbo
+  // stream reads one position further, wrapping at Kpi. D = 28 (20 CQI bits + CRC8): R = 1,
+  // ND = 4, v_k = y[P(k)] with the convolutional pattern. Positions y < ND are dummies.
+  struct Case {
+    std::uint32_t D;
+    SubBlockPattern pattern;
+    bool third;
+    std::uint32_t k, y;
+  };
+  const Case cases[] = {
+      {44, SubBlockPattern::Turbo, false, 0, 0},   {44, SubBlockPattern::Turbo, false, 1, 32},
+      {44, SubBlockPattern::Turbo, false, 2, 16},  {44, SubBlockPattern::Turbo, false, 3, 48},
+      {44, SubBlockPattern::Turbo, false, 63, 63}, {44, SubBlockPattern::Turbo, true, 0, 1},
+      {44, SubBlockPattern::Turbo, true, 1, 33},   {44, SubBlockPattern::Turbo, true, 62, 32},
+      {44, SubBlockPattern::Turbo, true, 63, 0},
+      {28, SubBlockPattern::Convolutional, false, 0, 1},
+      {28, SubBlockPattern::Convolutional, false, 1, 17},
+      {28, SubBlockPattern::Convolutional, false, 16, 0},
+      {28, SubBlockPattern::Convolutional, false, 31, 30},
+  };
+  for (const auto& c : cases) {
+    const Bits d = numbered(c.D);
+    const Bits v = subBlockInterleave(d, c.pattern, c.third);
+    const std::uint32_t ND = 32 * subBlockRows(c.D) - c.D;
+    ASSERT_EQ(v.size(), c.D + ND);
+    EXPECT_EQ(v[c.k], c.y < ND ? kNullBit : d[c.y - ND]) << c.D << " " << c.third << " " << c.k;
+    EXPECT_EQ(std::count(v.begin(), v.end(), kNullBit), static_cast<std::ptrdiff_t>(ND));
+  }
 }
 
 TEST(SubBlockInterleaver, EveryInputBitAppearsOnceForAllShapes) {
@@ -66,17 +77,6 @@ TEST(SubBlockInterleaver, EveryInputBitAppearsOnceForAllShapes) {
       }
     }
   }
-}
-
-TEST(SubBlockInterleaver, ConvolutionalReadsColumnOneFirst) {
-  // D = 28 (20 CQI bits + CRC8): R = 1, ND = 4, so v_k = y[P(k)].
-  const Bits d = numbered(28);
-  const Bits v = subBlockInterleave(d, SubBlockPattern::Convolutional);
-  ASSERT_EQ(v.size(), 32u);
-  EXPECT_EQ(v[0], kNullBit);    // y1
-  EXPECT_EQ(v[1], d[17 - 4]);   // y17
-  EXPECT_EQ(v[16], kNullBit);   // y0
-  EXPECT_EQ(v[31], d[30 - 4]);  // y30
 }
 
 }  // namespace

@@ -105,24 +105,6 @@ TEST(TurboEncoder, FillerBitsEnterAsZeroAndLeaveAsNull) {
   EXPECT_EQ(filled.d2, plain.d2);
 }
 
-TEST(TurboEncoder, EncodingIsLinear) {
-  // A linear code: encode(a) xor encode(b) = encode(a xor b), tails included.
-  const std::uint32_t K = 6144;
-  Bits a(K), b(K), sum(K);
-  for (std::uint32_t k = 0; k < K; ++k) {
-    a[k] = (k * k + 3 * k) % 5 < 2;
-    b[k] = (k / 3) % 2;
-    sum[k] = a[k] ^ b[k];
-  }
-  TurboCodeword da, db, ds;
-  ASSERT_TRUE(turboEncode(a, da) && turboEncode(b, db) && turboEncode(sum, ds));
-  for (std::uint32_t k = 0; k < K + 4; ++k) {
-    ASSERT_EQ(ds.d0[k], da.d0[k] ^ db.d0[k]) << k;
-    ASSERT_EQ(ds.d1[k], da.d1[k] ^ db.d1[k]) << k;
-    ASSERT_EQ(ds.d2[k], da.d2[k] ^ db.d2[k]) << k;
-  }
-}
-
 TEST(TurboEncoder, RefusesSizesOutsideTheTableAndNonBits) {
   TurboCodeword d;
   EXPECT_FALSE(turboEncode(Bits(41, 0), d));
