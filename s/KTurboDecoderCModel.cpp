@@ -9,6 +9,8 @@
 
 #include "errorLine.h"
 
+namespace brannoc {
+
 namespace {
 
 constexpr const char* kSource = "../s/KTurboDecoderCModel";
@@ -42,7 +44,7 @@ struct ModelArrays {
 KTurboDecoderCModel::KTurboDecoderCModel() : itsGenerics(vexlon_ip_corvane_get_default_generics()) {
   itsModel = vexlon_ip_corvane_create_state(itsGenerics);
   if (itsModel == nullptr) {
-    brannoc::errorLineFile(kSource, 84, kCouldNotCreate);
+    errorLineFile(kSource, 84, kCouldNotCreate);
   }
 }
 
@@ -50,7 +52,7 @@ KTurboDecoderCModel::KTurboDecoderCModel(const vexlon_ip_corvane_generics& gener
     : itsGenerics(generics) {
   itsModel = vexlon_ip_corvane_create_state(itsGenerics);
   if (itsModel == nullptr) {
-    brannoc::errorLineFile(kSource, 98, kCouldNotCreate);
+    errorLineFile(kSource, 98, kCouldNotCreate);
   }
 }
 
@@ -82,7 +84,7 @@ bool KTurboDecoderCModel::createModel(const vexlon_ip_corvane_generics& generics
   itsModel = vexlon_ip_corvane_create_state(generics);
   itsGenerics = generics;
   if (itsModel == nullptr) {
-    brannoc::errorLineFile(kSource, 117, kCouldNotCreate);
+    errorLineFile(kSource, 117, kCouldNotCreate);
     return false;
   }
   return true;
@@ -117,12 +119,12 @@ bool KTurboDecoderCModel::decode(const std::vector<std::int32_t>& sys,
                                  const std::vector<std::int32_t>& p2,
                                  std::vector<std::uint8_t>& out, std::uint32_t iterations) {
   if (itsModel == nullptr) {
-    brannoc::errorLineFile(kSource, 142, "ERROR:KTurboDecoderCModel:Decoder not yet created");
+    errorLineFile(kSource, 142, "ERROR:KTurboDecoderCModel:Decoder not yet created");
     return false;
   }
   const std::size_t N = sys.size();
   if (p1.size() != N || p2.size() != N) {
-    brannoc::errorLineFile(kSource, 151,
+    errorLineFile(kSource, 151,
                            "ERROR:KTurboDecoderCModel:LLRs should all be the same size");
     return false;
   }
@@ -132,7 +134,7 @@ bool KTurboDecoderCModel::decode(const std::vector<std::int32_t>& sys,
   const std::uint32_t K = streamLength >= 4 ? streamLength - 4 : 0;
   ModelArrays arrays;
   if (!arrays.allocate(N, 4 * static_cast<std::size_t>(K))) {
-    brannoc::errorLineBare("Error: Unable to allocate enough space for turbo decoder arrays");
+    errorLineBare("Error: Unable to allocate enough space for turbo decoder arrays");
     return false;
   }
   const std::vector<std::int32_t>* sources[3] = {&sys, &p1, &p2};
@@ -157,7 +159,7 @@ bool KTurboDecoderCModel::decode(const std::vector<std::int32_t>& sys,
   outputs.bits_capacity = K;
   const std::int32_t code = vexlon_ip_corvane_bitacc_simulate(itsModel, inputs, &outputs);
   if (code != 0) {
-    brannoc::errorLineFile(kSource, 203, "ERROR:KTurboDecoderCModel:Model returned error code ",
+    errorLineFile(kSource, 203, "ERROR:KTurboDecoderCModel:Model returned error code ",
                            code);
     return false;
   }
@@ -166,3 +168,5 @@ bool KTurboDecoderCModel::decode(const std::vector<std::int32_t>& sys,
   out.assign(arrays.bits, arrays.bits + stored);
   return true;
 }
+
+}  // namespace brannoc

@@ -11,6 +11,8 @@
 
 #include "vexlon_ip_corvane_bitacc_cmodel.h"
 
+namespace brannoc {
+
 class KTurboDecoderCModel {
  public:
   // Takes the library's default generics and creates a model (one error line on failure).
@@ -51,5 +53,7 @@ class KTurboDecoderCModel {
   vexlon_ip_corvane_generics itsGenerics;
   vexlon_ip_corvane_state* itsModel = nullptr;
 };
+
+}  // namespace brannoc
 
 #endif  // BRANNOC_KTURBODECODERCMODEL_H

@@ -11,6 +11,8 @@
 
 namespace {
 
+using brannoc::KTurboDecoderCModel;
+
 const std::string kPrefix = "File: ../s/KTurboDecoderCModel(";
 
 std::vector<std::int32_t> softOf(const brannoc::tx::Bits& bits) {
