@@ -136,11 +136,19 @@ void decodeWindow(const Metric* lu, const Metric* lp, int length, const StateMet
   for (int k = 0; k < length; ++k) {
     forwardStep<Policy>(alphaStore[k], alphaStore[k + 1], lu[k], lp[k]);
   }
+  // Two beta registers in turn, two steps per pass, so no metrics are copied.
   StateMetrics beta = betaEnd;
-  for (int k = length - 1; k >= 0; --k) {
+  StateMetrics previous;
+  int k = length - 1;
+  for (; k >= 1; k -= 2) {
     extrinsic[k] = extrinsicStep<Policy>(alphaStore[k], beta, lp[k]);
-    StateMetrics previous;
     backwardStep<Policy>(beta, previous, lu[k], lp[k]);
+    extrinsic[k - 1] = extrinsicStep<Policy>(alphaStore[k - 1], previous, lp[k - 1]);
+    backwardStep<Policy>(previous, beta, lu[k - 1], lp[k - 1]);
+  }
+  if (k == 0) {
+    extrinsic[0] = extrinsicStep<Policy>(alphaStore[0], beta, lp[0]);
+    backwardStep<Policy>(beta, previous, lu[0], lp[0]);
     beta = previous;
   }
   betaStart = beta;
