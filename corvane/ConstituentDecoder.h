@@ -44,55 +44,54 @@ inline Metric toMetric(int value) { return static_cast<Metric>(value); }
 
 }  // namespace detail
 
-// alpha_{k+1} from alpha_k and the step's Lu, Lp; normalised to state 0. Butterfly j reads
-// states 2j, 2j+1 and writes j (type A from 2j) and j+4 (type A from 2j+1); the type A
-// branch metric of butterfly 0..3 is 0, Lu, Lp, Lu+Lp and type B the complement.
+// The radix-2 butterfly shared by both recursions: two metrics x0, x1 extended over the
+// type A and type B branch metrics into the two metrics they reach.
+template <class Policy>
+inline void butterfly(int x0, int x1, int typeA, int typeB, int& out0, int& out1) {
+  out0 = Policy::combine(x0 + typeA, x1 + typeB);
+  out1 = Policy::combine(x0 + typeB, x1 + typeA);
+}
+
+// Stores the eight metrics of a step relative to that of state 0.
+inline void storeNormalised(int n0, int n1, int n2, int n3, int n4, int n5, int n6, int n7,
+                            StateMetrics& out) {
+  out.m[0] = 0;
+  out.m[1] = detail::toMetric(n1 - n0);
+  out.m[2] = detail::toMetric(n2 - n0);
+  out.m[3] = detail::toMetric(n3 - n0);
+  out.m[4] = detail::toMetric(n4 - n0);
+  out.m[5] = detail::toMetric(n5 - n0);
+  out.m[6] = detail::toMetric(n6 - n0);
+  out.m[7] = detail::toMetric(n7 - n0);
+}
+
+// alpha_{k+1} from alpha_k and the step's Lu, Lp. Butterfly j reads states 2j, 2j+1 and
+// writes j (type A from 2j) and j+4 (type A from 2j+1); the type A branch metric of
+// butterfly 0..3 is 0, Lu, Lp, Lu+Lp and type B the complement.
 template <class Policy>
 inline void forwardStep(const StateMetrics& alpha, StateMetrics& next, int lu, int lp) {
   const int both = lu + lp;
-  const int a0 = alpha.m[0], a1 = alpha.m[1], a2 = alpha.m[2], a3 = alpha.m[3];
-  const int a4 = alpha.m[4], a5 = alpha.m[5], a6 = alpha.m[6], a7 = alpha.m[7];
-  const int n0 = Policy::combine(a0, a1 + both);
-  const int n4 = Policy::combine(a0 + both, a1);
-  const int n1 = Policy::combine(a2 + lu, a3 + lp);
-  const int n5 = Policy::combine(a2 + lp, a3 + lu);
-  const int n2 = Policy::combine(a4 + lp, a5 + lu);
-  const int n6 = Policy::combine(a4 + lu, a5 + lp);
-  const int n3 = Policy::combine(a6 + both, a7);
-  const int n7 = Policy::combine(a6, a7 + both);
-  next.m[0] = 0;
-  next.m[1] = detail::toMetric(n1 - n0);
-  next.m[2] = detail::toMetric(n2 - n0);
-  next.m[3] = detail::toMetric(n3 - n0);
-  next.m[4] = detail::toMetric(n4 - n0);
-  next.m[5] = detail::toMetric(n5 - n0);
-  next.m[6] = detail::toMetric(n6 - n0);
-  next.m[7] = detail::toMetric(n7 - n0);
+  const Metric* a = alpha.m;
+  int n0, n1, n2, n3, n4, n5, n6, n7;
+  butterfly<Policy>(a[0], a[1], 0, both, n0, n4);
+  butterfly<Policy>(a[2], a[3], lu, lp, n1, n5);
+  butterfly<Policy>(a[4], a[5], lp, lu, n2, n6);
+  butterfly<Policy>(a[6], a[7], both, 0, n3, n7);
+  storeNormalised(n0, n1, n2, n3, n4, n5, n6, n7, next);
 }
 
-// beta_k from beta_{k+1} and the step's Lu, Lp; normalised to state 0. State 2j leaves on
-// type A to j and type B to j+4, state 2j+1 the other way round.
+// beta_k from beta_{k+1} and the step's Lu, Lp: state 2j leaves on type A to j and type B
+// to j+4, state 2j+1 the other way round.
 template <class Policy>
 inline void backwardStep(const StateMetrics& beta, StateMetrics& previous, int lu, int lp) {
   const int both = lu + lp;
-  const int b0 = beta.m[0], b1 = beta.m[1], b2 = beta.m[2], b3 = beta.m[3];
-  const int b4 = beta.m[4], b5 = beta.m[5], b6 = beta.m[6], b7 = beta.m[7];
-  const int p0 = Policy::combine(b0, b4 + both);
-  const int p1 = Policy::combine(b0 + both, b4);
-  const int p2 = Policy::combine(b1 + lu, b5 + lp);
-  const int p3 = Policy::combine(b1 + lp, b5 + lu);
-  const int p4 = Policy::combine(b2 + lp, b6 + lu);
-  const int p5 = Policy::combine(b2 + lu, b6 + lp);
-  const int p6 = Policy::combine(b3 + both, b7);
-  const int p7 = Policy::combine(b3, b7 + both);
-  previous.m[0] = 0;
-  previous.m[1] = detail::toMetric(p1 - p0);
-  previous.m[2] = detail::toMetric(p2 - p0);
-  previous.m[3] = detail::toMetric(p3 - p0);
-  previous.m[4] = detail::toMetric(p4 - p0);
-  previous.m[5] = detail::toMetric(p5 - p0);
-  previous.m[6] = detail::toMetric(p6 - p0);
-  previous.m[7] = detail::toMetric(p7 - p0);
+  const Metric* b = beta.m;
+  int p0, p1, p2, p3, p4, p5, p6, p7;
+  butterfly<Policy>(b[0], b[4], 0, both, p0, p1);
+  butterfly<Policy>(b[1], b[5], lu, lp, p2, p3);
+  butterfly<Policy>(b[2], b[6], lp, lu, p4, p5);
+  butterfly<Policy>(b[3], b[7], both, 0, p6, p7);
+  storeNormalised(p0, p1, p2, p3, p4, p5, p6, p7, previous);
 }
 
 // Combines four values pairwise in a fixed order, so that max* rounds the same way in every
