@@ -131,6 +131,7 @@ int main(void) {
   check_sch_outputs();
   check_cch();
   check_calls();
-  printf("%d-bit ABI check: %s\n", (int)(8 * sizeof(void *)), abi_failures == 0 ? "passed" : "FAILED");
+  printf("%d-bit ABI check: %s\n", (int)(8 * sizeof(void *)),
+         abi_failures == 0 ? "passed" : "FAILED");
   return abi_failures == 0 ? 0 : 1;
 }
