@@ -13,82 +13,61 @@
 namespace {
 
 using brannoc::KQuantized;
-using testing::internal::CaptureStderr;
-using testing::internal::GetCapturedStderr;
 
 const std::string kHigh = "Saturation (HIGH) ocurred.\n";
 const std::string kLow = "Saturation (LOW ) ocurred.\n";
 const std::string kFormatWarning =
     ": Parameters do not describe a fixed number correctly. Format created may not match "
     "desired format.\n";
-// The format-text error line reported from the given line with the given ending.
-std::string formatTextError(int line, const std::string& ending) {
-  return "File: ../s/KQuantized (" + std::to_string(line) +
-         ") Error in KQuantized::setTypeFromString. Need a string with a A:B format" + ending +
-         "\n";
-}
 
 KQuantized llr(bool verbose = false) { return KQuantized(0.0, 3, 5, verbose); }
 
 template <typename F>
 std::string stderrOf(F&& f) {
-  CaptureStderr();
+  testing::internal::CaptureStderr();
   f();
-  return GetCapturedStderr();
-}
-
-TEST(KQuantized, LlrFormatFromTextHasTheEightFiveRange) {
-  KQuantized q(0.0, 8, 8, false);
-  ASSERT_TRUE(q.setTypeFromString("8:5"));
-  EXPECT_EQ(q.getNINTBITS(), 3u);
-  EXPECT_EQ(q.getNFRACBITS(), 5u);
-  EXPECT_EQ(q.getNBITS(), 8u);
-  EXPECT_EQ(q.getScale(), 32u);
-  EXPECT_EQ(q.getMinQ(), -128);
-  EXPECT_EQ(q.getMaxQ(), 127);
-  EXPECT_EQ(q.getMin(), -4.0);
-  EXPECT_EQ(q.getMax(), 3.96875);
-  EXPECT_EQ(q.getMask(), 255u);
-  EXPECT_EQ(q.getTypeString(), "8:5");
+  return testing::internal::GetCapturedStderr();
 }
 
 TEST(KQuantized, FormatTextParsingAcceptsOrRejectsWithTheRightLine) {
+  const auto error = [](int line, const std::string& ending) {
+    return "File: ../s/KQuantized (" + std::to_string(line) +
+           ") Error in KQuantized::setTypeFromString. Need a string with a A:B format" + ending +
+           "\n";
+  };
   struct Case {
     const char* text;
-    bool ok;
-    const char* format;  // format afterwards; a rejected text keeps 16:8
+    const char* format;  // format afterwards; a rejected text keeps 16:8 and the raw value
     std::string line;
   };
   const Case cases[] = {
-      {"8:5", true, "8:5", ""},
-      {"8:5:", true, "8:5", ""},
-      {" 8 : 5", true, "8:5", ""},
-      {"\t8:\n5\n", true, "8:5", ""},
-      {"0x8:5", true, "8:5", ""},
-      {"010:5", true, "8:5", ""},
-      {"54:5", true, "54:5", ""},
-      {"8::5", false, "16:8", formatTextError(248, "")},
-      {"8", false, "16:8", formatTextError(248, "")},
-      {"8: ", false, "16:8", formatTextError(248, "")},
-      {"", false, "16:8", formatTextError(248, "")},
-      {"5:5", false, "16:8", formatTextError(252, ", where A > B")},
-      {"3:5", false, "16:8", formatTextError(252, ", where A > B")},
-      {":5", false, "16:8", formatTextError(252, ", where A > B")},
-      {"55:5", false, "16:8", formatTextError(254, ", where A <=54")},
+      {"8:5", "8:5", ""},
+      {"8:5:", "8:5", ""},
+      {"\t8:\n5\n", "8:5", ""},
+      {"0x8:5", "8:5", ""},
+      {"010:5", "8:5", ""},
+      {"54:5", "54:5", ""},
+      {"8::5", "16:8", error(248, "")},
+      {"8: ", "16:8", error(248, "")},
+      {"", "16:8", error(248, "")},
+      {"5:5", "16:8", error(252, ", where A > B")},
+      {":5", "16:8", error(252, ", where A > B")},
+      {"55:5", "16:8", error(254, ", where A <=54")},
   };
   for (const Case& c : cases) {
     KQuantized q(0.0, 8, 8, false);
     ASSERT_TRUE(q.setValueQ(-300));
     bool ok = false;
     EXPECT_EQ(stderrOf([&] { ok = q.setTypeFromString(c.text); }), c.line) << c.text;
-    EXPECT_EQ(ok, c.ok) << c.text;
+    EXPECT_EQ(ok, c.line.empty()) << c.text;
     EXPECT_EQ(q.getTypeString(), c.format) << c.text;
-    if (!c.ok) {
+    if (!ok) {
       EXPECT_EQ(q.getValueQ(), -300) << c.text;
     }
   }
 }
 
+// 3.97 rounds to raw 127 but lies above Max = 3.96875: it saturates HIGH all the same.
 TEST(KQuantized, SetValueRoundsHalfAwayFromZeroAndJudgesSaturationOnTheInput) {
   struct Case {
     double x;
@@ -101,36 +80,24 @@ TEST(KQuantized, SetValueRoundsHalfAwayFromZeroAndJudgesSaturationOnTheInput) {
       {1.0, 32, true, ""},        {0.015625, 1, true, ""},  {-0.015625, -1, true, ""},
       {0.0468750, 2, true, ""},   {-0.0, 0, true, ""},      {3.96875, 127, true, ""},
       {3.97, 127, false, kHigh},  {-4.0, -128, true, ""},   {-4.001, -128, false, kLow},
-      {100.0, 127, false, kHigh}, {inf, 127, false, kHigh}, {-inf, -128, false, kLow},
+      {inf, 127, false, kHigh},   {-inf, -128, false, kLow},
+      {std::nan(""), 0, false, ""},  // no information: raw 0, no line
   };
   for (const Case& c : cases) {
     KQuantized q = llr(true);
+    ASSERT_TRUE(q.setValueQ(77));
     bool ok = true;
     EXPECT_EQ(stderrOf([&] { ok = q.setValue(c.x); }), c.line) << c.x;
     EXPECT_EQ(ok, c.ok) << c.x;
     EXPECT_EQ(q.getValueQ(), c.raw) << c.x;
-    // The same saturation is silent when not verbose.
-    KQuantized quiet = llr();
+    KQuantized quiet = llr();  // the same saturation is silent when not verbose
     EXPECT_EQ(stderrOf([&] { quiet.setValue(c.x); }), "") << c.x;
   }
-}
-
-TEST(KQuantized, NotANumberGivesZeroAndFalseWithoutALine) {
-  KQuantized q = llr(true);
-  ASSERT_TRUE(q.setValueQ(77));
-  bool ok = true;
-  EXPECT_EQ(stderrOf([&] { ok = q.setValue(std::nan("")); }), "");
-  EXPECT_FALSE(ok);
-  EXPECT_EQ(q.getValueQ(), 0);
-}
-
-TEST(KQuantized, SetValueQClampsToTheRawRange) {
   KQuantized q = llr(true);
   EXPECT_EQ(stderrOf([&] { EXPECT_FALSE(q.setValueQ(200)); }), kHigh);
   EXPECT_EQ(q.getValueQ(), 127);
   EXPECT_EQ(stderrOf([&] { EXPECT_FALSE(q.setValueQ(-129)); }), kLow);
   EXPECT_EQ(q.getValueQ(), -128);
-  EXPECT_TRUE(q.setValueQ(-128));
 }
 
 TEST(KQuantized, SumIsExactInTheWiderFormatThenNarrowingClamps) {
@@ -139,25 +106,19 @@ TEST(KQuantized, SumIsExactInTheWiderFormatThenNarrowingClamps) {
   b.setValueQ(127);
   KQuantized sum = a + b;
   EXPECT_EQ(sum.getValueQ(), 254);
-  EXPECT_EQ(sum.getNINTBITS(), 4u);
   EXPECT_EQ(sum.getTypeString(), "9:5");
   EXPECT_EQ(a.getTypeString(), "8:5");  // operands untouched
   EXPECT_FALSE(sum.setNINTBITS(3));
   EXPECT_EQ(sum.getValueQ(), 127);
-  EXPECT_TRUE(sum.changeFormat(3, 5));
 
   a.setValueQ(-128);
   a -= b;
   EXPECT_EQ(a.getValueQ(), -255);
-  EXPECT_EQ(a.getTypeString(), "9:5");
   EXPECT_EQ(a.copyWithNINTBITS(3).getValueQ(), -128);
-}
 
-TEST(KQuantized, SumOfDifferentFormatsAlignsTheFractionBits) {
-  KQuantized a = llr();            // 8:5
-  KQuantized b(1.5, 2, 3, false);  // 5:3, raw 12
-  a.setValueQ(-3);
-  KQuantized sum = a + b;  // 1.5 - 0.09375 in 9:5
+  KQuantized c(1.5, 2, 3, false);  // 5:3, raw 12: fraction bits align to 5
+  b.setValueQ(-3);
+  sum = b + c;
   EXPECT_EQ(sum.getTypeString(), "9:5");
   EXPECT_EQ(sum.getValueQ(), 48 - 3);
 }
@@ -194,9 +155,6 @@ TEST(KQuantized, VectorFormsConvertEveryElementAndReportAnySaturation) {
   std::vector<std::int64_t> raw = {9, 9, 9, 9, 9};
   EXPECT_FALSE(q.quantize(std::vector<double>{1.0, 5.0, -0.015625}, raw));
   EXPECT_EQ(raw, (std::vector<std::int64_t>{32, 127, -1}));
-  EXPECT_EQ(q.getValueQ(), -1);
-  EXPECT_TRUE(q.quantize(std::vector<std::int32_t>{1, -4, 3}, raw));
-  EXPECT_EQ(raw, (std::vector<std::int64_t>{32, -128, 96}));
 
   std::vector<std::int64_t> im;
   EXPECT_FALSE(q.quantize(std::vector<std::complex<double>>{{1.0, -0.5}, {-9.0, 0.25}}, raw, im));
@@ -206,8 +164,6 @@ TEST(KQuantized, VectorFormsConvertEveryElementAndReportAnySaturation) {
   std::vector<double> real;
   EXPECT_FALSE(q.dequantize(std::vector<std::int64_t>{40, 200}, real));
   EXPECT_EQ(real, (std::vector<double>{1.25, 3.96875}));
-  EXPECT_TRUE(q.dequantize(std::vector<std::int64_t>{}, real));
-  EXPECT_TRUE(real.empty());
 
   std::vector<std::complex<double>> z;
   EXPECT_TRUE(q.dequantize({40, -32}, {16, 8, 99}, z));
@@ -216,38 +172,29 @@ TEST(KQuantized, VectorFormsConvertEveryElementAndReportAnySaturation) {
   EXPECT_TRUE(z.empty());
 }
 
-TEST(KQuantized, ConstructorWarnsOfACutFormatEvenWhenNotVerbose) {
-  EXPECT_EQ(stderrOf([] { KQuantized(0.0, 3, 60, false); }), "KQuantized" + kFormatWarning);
-  EXPECT_EQ(stderrOf([] { KQuantized(5.0, 3, 5, false); }), "");
-  EXPECT_EQ(stderrOf([] { KQuantized(5.0, 3, 5, true); }), kHigh + "Saturation ocurred.\n");
-}
-
 TEST(KQuantized, WidthCapsCutTheNamedWidthAndWarn) {
+  EXPECT_EQ(stderrOf([] { KQuantized(0.0, 3, 60, false); }), "KQuantized" + kFormatWarning);
+  EXPECT_EQ(stderrOf([] { KQuantized(5.0, 3, 5, true); }), kHigh + "Saturation ocurred.\n");
   struct Case {
     const char* what;
     bool (*change)(KQuantized&);
-    std::uint32_t NINTBITS, NFRACBITS, NBITS;
+    std::uint32_t NINTBITS, NFRACBITS;
     std::string line;
   };
   const Case cases[] = {
-      {"frac 60", [](KQuantized& q) { return q.setNFRACBITS(60); }, 3, 50, 54,
+      {"frac 60", [](KQuantized& q) { return q.setNFRACBITS(60); }, 3, 50,
        "setNFRACBITS" + kFormatWarning},
-      {"int 60", [](KQuantized& q) { return q.setNINTBITS(60); }, 48, 5, 54,
+      {"int 60", [](KQuantized& q) { return q.setNINTBITS(60); }, 48, 5,
        "setNINTBITS" + kFormatWarning},
-      {"30:30", [](KQuantized& q) { return q.changeFormat(30, 30); }, 30, 23, 54,
+      {"0:0", [](KQuantized& q) { return q.changeFormat(0, 0); }, 0, 0,
        "changeFormat" + kFormatWarning},
-      {"54:5 leaves no fraction", [](KQuantized& q) { return q.changeFormat(54, 5); }, 54, 0, 54,
-       "changeFormat" + kFormatWarning},
-      {"0:0", [](KQuantized& q) { return q.changeFormat(0, 0); }, 0, 0, 0,
-       "changeFormat" + kFormatWarning},
-      {"1:53 fits", [](KQuantized& q) { return q.changeFormat(1, 53); }, 1, 53, 54, ""},
+      {"1:53 fits", [](KQuantized& q) { return q.changeFormat(1, 53); }, 1, 53, ""},
   };
   for (const Case& c : cases) {
     KQuantized q = llr();
     EXPECT_EQ(stderrOf([&] { c.change(q); }), c.line) << c.what;
     EXPECT_EQ(q.getNINTBITS(), c.NINTBITS) << c.what;
     EXPECT_EQ(q.getNFRACBITS(), c.NFRACBITS) << c.what;
-    EXPECT_EQ(q.getNBITS(), c.NBITS) << c.what;
     EXPECT_EQ(q.getScale(), std::uint64_t{1} << c.NFRACBITS) << c.what;
     EXPECT_LE(q.getMinQ(), q.getValueQ()) << c.what;
     EXPECT_LE(q.getValueQ(), q.getMaxQ()) << c.what;
@@ -257,7 +204,6 @@ TEST(KQuantized, WidthCapsCutTheNamedWidthAndWarn) {
 TEST(KQuantized, WidestFormatStaysExact) {
   constexpr std::int64_t kMax54 = (std::int64_t{1} << 53) - 1;
   KQuantized q(0.0, 54, 0, false);
-  EXPECT_EQ(q.getMaxQ(), kMax54);
   EXPECT_EQ(q.getMax(), static_cast<double>(kMax54));
   // Adding one half to 2^53 - 1 rounds up to 2^53 in double; the result still fits.
   EXPECT_TRUE(q.setValue(q.getMax()));
