@@ -2,23 +2,10 @@
    the 32-bit contract build has 4-byte pointers), then links and calls the shared library.
    The expected offsets are written out by hand from the record tables, not derived from
    the header. Exits non-zero on the first mismatch, after printing it. */
-#include <stddef.h>
 #include <stdio.h>
 
+#include "abi_expect.h"
 #include "vexlon_ip_brannoc_bitacc_cmodel.h"
-
-static int failures = 0;
-
-static void expect(const char *what, size_t actual, size_t expected32, size_t expected64) {
-  size_t expected = sizeof(void *) == 4 ? expected32 : expected64;
-  if (actual != expected) {
-    printf("ABI mismatch: %s is %zu, expected %zu\n", what, actual, expected);
-    ++failures;
-  }
-}
-
-#define FIELD(type, field, at32, at64) expect(#type "." #field, offsetof(type, field), at32, at64)
-#define SIZE(type, size32, size64) expect("sizeof " #type, sizeof(type), size32, size64)
 
 static void check_generics(void) {
   SIZE(vexlon_ip_brannoc_generics, 16, 16);
@@ -123,17 +110,17 @@ static void check_calls(void) {
   if (generics.C_NUM_PU != 2 || generics.C_ALGORITHM_TYPE != 1 ||
       generics.C_INTERLEAVER_BUFFER_SIZE != 36864 || generics.C_NUM_CQI_PU != 1) {
     printf("default generics are wrong\n");
-    ++failures;
+    ++abi_failures;
   }
   generics.C_NUM_PU = 3;
   if (vexlon_ip_brannoc_create_state(generics) != NULL) {
     printf("create_state accepted C_NUM_PU 3\n");
-    ++failures;
+    ++abi_failures;
   }
   vexlon_ip_brannoc_destroy_state(NULL);
   if (IUO_set_debugfn_state(NULL, 33, 0, "x", 1) != 0) {
     printf("IUO_set_debugfn_state accepted key 33\n");
-    ++failures;
+    ++abi_failures;
   }
 }
 
@@ -144,6 +131,7 @@ int main(void) {
   check_sch_outputs();
   check_cch();
   check_calls();
-  printf("%d-bit ABI check: %s\n", (int)(8 * sizeof(void *)), failures == 0 ? "passed" : "FAILED");
-  return failures == 0 ? 0 : 1;
+  printf("%d-bit ABI check: %s\n", (int)(8 * sizeof(void *)),
+         abi_failures == 0 ? "passed" : "FAILED");
+  return abi_failures == 0 ? 0 : 1;
 }

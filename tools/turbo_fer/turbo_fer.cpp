@@ -1,0 +1,208 @@
+// Frame error rate of the turbo-decoder model library over an AWGN channel: the
+// transmitter's turbo codewords (TS 36.212 clause 5.1.3.2, rate 1/3 with the 12 tail bits)
+// sent as BPSK, noise and 8:5 quantisation from the transmitter's channel model, decoded
+// through the library's C interface. One table row per Eb/N0 point.
+//
+// Eb/N0 counts the information bits: Es/N0 = Eb/N0 + 10 log10(K / (3K + 12)), slightly
+// harsher than the nominal rate 1/3. The soft values are raw = round(scale * LLR), halves
+// away from zero, saturated to -128..127, LLR = ln(P(1)/P(0)) computed with the true noise
+// variance; the default scale is 8 raw steps per natural-log unit, the scale the log-MAP
+// correction table of the library assumes.
+//
+// Each frame draws its bits and its noise from seeds derived from the frame number, so a
+// frame is the same whichever thread decodes it. A point stops once it has the requested
+// number of frame errors or the frame cap; frames in flight then are still counted.
+#include <atomic>
+#include <cmath>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "tx/SoftChannel.h"
+#include "tx/TurboEncoder.h"
+#include "vexlon_ip_corvane_bitacc_cmodel.h"
+
+namespace {
+
+struct Options {
+  std::uint32_t K = 6144;
+  std::uint32_t algorithm = 1;
+  std::uint32_t units = 1;
+  std::uint32_t iterations = 6;
+  std::uint32_t extrinsicBits = 10;
+  double from = 0.4;
+  double to = 1.0;
+  double step = 0.1;
+  std::uint64_t minErrors = 50;
+  std::uint64_t maxFrames = 20000;
+  double scale = 8.0;
+  unsigned threads = 2;
+  std::uint64_t seed = 1;
+};
+
+void usage() {
+  std::fprintf(stderr,
+               "usage: turbo_fer [--K n] [--algorithm 0|1|2] [--units 1|2|4|8] [--iterations n]\n"
+               "                 [--extrinsic-bits n] [--from dB] [--to dB] [--step dB]\n"
+               "                 [--errors n] [--frames n] [--scale raw-per-LLR] [--threads n]\n"
+               "                 [--seed n]\n");
+}
+
+std::uint32_t toU32(const char* text) {
+  return static_cast<std::uint32_t>(std::strtoul(text, nullptr, 10));
+}
+
+bool parse(int argc, char** argv, Options& o) {
+  for (int i = 1; i + 1 < argc; i += 2) {
+    const std::string name = argv[i];
+    const char* value = argv[i + 1];
+    if (name == "--K") {
+      o.K = toU32(value);
+    } else if (name == "--algorithm") {
+      o.algorithm = toU32(value);
+    } else if (name == "--units") {
+      o.units = toU32(value);
+    } else if (name == "--iterations") {
+      o.iterations = toU32(value);
+    } else if (name == "--extrinsic-bits") {
+      o.extrinsicBits = toU32(value);
+    } else if (name == "--from") {
+      o.from = std::strtod(value, nullptr);
+    } else if (name == "--to") {
+      o.to = std::strtod(value, nullptr);
+    } else if (name == "--step") {
+      o.step = std::strtod(value, nullptr);
+    } else if (name == "--errors") {
+      o.minErrors = std::strtoull(value, nullptr, 10);
+    } else if (name == "--frames") {
+      o.maxFrames = std::strtoull(value, nullptr, 10);
+    } else if (name == "--scale") {
+      o.scale = std::strtod(value, nullptr);
+    } else if (name == "--threads") {
+      o.threads = toU32(value);
+    } else if (name == "--seed") {
+      o.seed = std::strtoull(value, nullptr, 10);
+    } else {
+      return false;
+    }
+  }
+  return argc % 2 == 1 && o.step > 0 && o.threads > 0 && o.scale > 0;
+}
+
+std::uint64_t mix(std::uint64_t x) {
+  x += 0x9E3779B97F4A7C15ull;
+  x = (x ^ (x >> 30)) * 0xBF58476D1CE4E5B9ull;
+  x = (x ^ (x >> 27)) * 0x94D049BB133111EBull;
+  return x ^ (x >> 31);
+}
+
+struct Counts {
+  std::atomic<std::uint64_t> nextFrame{0};
+  std::atomic<std::uint64_t> frames{0};
+  std::atomic<std::uint64_t> frameErrors{0};
+  std::atomic<std::uint64_t> bitErrors{0};
+};
+
+// Decodes frames of one Eb/N0 point until the point has enough errors or frames.
+bool runWorker(const Options& o, double esN0Db, std::uint64_t pointSeed, Counts& counts) {
+  vexlon_ip_corvane_generics generics = vexlon_ip_corvane_get_default_generics();
+  generics.max_block_size = o.K;
+  generics.processing_units = o.units;
+  generics.algorithm = o.algorithm;
+  generics.extrinsic_bits = o.extrinsicBits;
+  vexlon_ip_corvane_state* model = vexlon_ip_corvane_create_state(generics);
+  if (model == nullptr) return false;
+  brannoc::tx::ChannelSettings channel;
+  channel.mode = brannoc::tx::ChannelMode::Awgn;
+  channel.esN0Db = esN0Db;
+  channel.llrScale = o.scale / brannoc::tx::kSoftOne;
+  std::vector<std::uint8_t> c(o.K), decided(o.K);
+  std::vector<std::int32_t> soft[3];
+  brannoc::tx::TurboCodeword d;
+  bool ok = true;
+  while (counts.frameErrors.load() < o.minErrors) {
+    const std::uint64_t frame = counts.nextFrame.fetch_add(1);
+    if (frame >= o.maxFrames) break;
+    std::uint64_t bitSeed = mix(pointSeed ^ mix(frame));
+    for (std::uint32_t k = 0; k < o.K; k += 64) {
+      bitSeed = mix(bitSeed);
+      for (std::uint32_t b = 0; b < 64 && k + b < o.K; ++b) c[k + b] = (bitSeed >> b) & 1;
+    }
+    if (!brannoc::tx::turboEncode(c, d)) {
+      ok = false;
+      break;
+    }
+    brannoc::tx::GaussianSource noise(mix(bitSeed + 1));
+    const brannoc::tx::Bits* streams[3] = {&d.d0, &d.d1, &d.d2};
+    for (int s = 0; s < 3; ++s) {
+      soft[s].clear();
+      brannoc::tx::appendSoftValues(*streams[s], brannoc::tx::Constellation::PucchBpsk, channel,
+                                    noise, soft[s]);
+    }
+    const std::uint32_t N = o.K + 4;
+    const vexlon_ip_corvane_inputs in{o.K, o.iterations, 1, 0, soft[0].data(), N,
+                                      soft[1].data(), N, soft[2].data(), N, 0, 0};
+    vexlon_ip_corvane_outputs out{0, 0, decided.data(), o.K};
+    if (vexlon_ip_corvane_bitacc_simulate(model, in, &out) != 0) {
+      ok = false;
+      break;
+    }
+    std::uint64_t errors = 0;
+    for (std::uint32_t k = 0; k < o.K; ++k) errors += decided[k] != c[k] ? 1 : 0;
+    counts.frames.fetch_add(1);
+    counts.bitErrors.fetch_add(errors);
+    if (errors != 0) counts.frameErrors.fetch_add(1);
+  }
+  vexlon_ip_corvane_destroy_state(model);
+  return ok;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  Options o;
+  if (!parse(argc, argv, o)) {
+    usage();
+    return 2;
+  }
+  const double rate = static_cast<double>(o.K) / (3.0 * o.K + 12.0);
+  std::printf("# K %u, algorithm %u, units %u, iterations %u, extrinsic bits %u,"
+              " scale %.3g raw/LLR, BPSK over AWGN, rate %u/%u\n",
+              o.K, o.algorithm, o.units, o.iterations, o.extrinsicBits, o.scale, o.K,
+              3 * o.K + 12);
+  std::printf("# stop at %llu frame errors or %llu frames\n",
+              static_cast<unsigned long long>(o.minErrors),
+              static_cast<unsigned long long>(o.maxFrames));
+  std::printf("| Eb/N0 (dB) | frames | frame errors | FER | BER |\n|---|---|---|---|---|\n");
+  std::fflush(stdout);
+  for (int point = 0;; ++point) {
+    const double ebN0Db = o.from + point * o.step;
+    if (ebN0Db > o.to + 1e-9) break;
+    const double esN0Db = ebN0Db + 10.0 * std::log10(rate);
+    Counts counts;
+    std::vector<std::thread> workers;
+    std::atomic<bool> failed{false};
+    const std::uint64_t pointSeed = mix(o.seed * 1000 + static_cast<std::uint64_t>(point));
+    for (unsigned t = 0; t < o.threads; ++t) {
+      workers.emplace_back([&] {
+        if (!runWorker(o, esN0Db, pointSeed, counts)) failed = true;
+      });
+    }
+    for (std::thread& worker : workers) worker.join();
+    if (failed) {
+      std::fprintf(stderr, "turbo_fer: the model refused the configuration or a frame\n");
+      return 1;
+    }
+    const double frames = static_cast<double>(counts.frames.load());
+    std::printf("| %.2f | %llu | %llu | %.3e | %.3e |\n", ebN0Db,
+                static_cast<unsigned long long>(counts.frames.load()),
+                static_cast<unsigned long long>(counts.frameErrors.load()),
+                counts.frameErrors.load() / frames, counts.bitErrors.load() / (frames * o.K));
+    std::fflush(stdout);
+  }
+  return 0;
+}
