@@ -11,12 +11,7 @@ if(BRANNOC_ARCH_BITS EQUAL 32)
 else()
   set(BRANNOC_CMAKE_DIR lib/cmake/brannoc)
 endif()
-set(brannoc_installed_libraries Ip_brannoc_bitacc_cmodel)
-if(TARGET Ip_corvane_bitacc_cmodel)
-  list(APPEND brannoc_installed_libraries Ip_corvane_bitacc_cmodel)
-endif()
-
-install(TARGETS ${brannoc_installed_libraries} EXPORT brannocTargets
+install(TARGETS Ip_brannoc_bitacc_cmodel Ip_corvane_bitacc_cmodel EXPORT brannocTargets
   LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
 install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/ DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
   FILES_MATCHING PATTERN "*.h")
