@@ -16,12 +16,14 @@ constexpr std::string_view kSource = "../s/KRateDeMatch";
 
 // Inter-column permutations of the sub-block interleaver: TS 36.212 Table 5.1.4-1 (turbo
 // coded, mode 0) and Table 5.1.4-2 (convolutionally coded, mode 1).
+// clang-format off
 constexpr std::array<std::int32_t, 32> kTurboColumns = {
     0, 16, 8, 24, 4, 20, 12, 28, 2, 18, 10, 26, 6, 22, 14, 30,
     1, 17, 9, 25, 5, 21, 13, 29, 3, 19, 11, 27, 7, 23, 15, 31};
 constexpr std::array<std::int32_t, 32> kConvColumns = {
     1, 17, 9, 25, 5, 21, 13, 29, 3, 19, 11, 27, 7, 23, 15, 31,
     0, 16, 8, 24, 4, 20, 12, 28, 2, 18, 10, 26, 6, 22, 14, 30};
+// clang-format on
 
 const std::array<std::int32_t, 32>* columnPattern(std::uint32_t mode) {
   if (mode == 0) {
@@ -77,8 +79,8 @@ bool placeSoftValue(std::vector<std::int32_t>& out, std::int32_t position, std::
   const std::int64_t index = std::int64_t{position} - ND;
   if (index < 0 || index >= static_cast<std::int64_t>(out.size())) {
     errorLineFile(kSource, __LINE__, " interleaver position ", position,
-                           " lies outside the stream of ", out.size(),
-                           " soft values after ", ND, " dummies");
+                  " lies outside the stream of ", out.size(), " soft values after ", ND,
+                  " dummies");
     return false;
   }
   out[static_cast<std::size_t>(index)] = value;
@@ -113,8 +115,7 @@ bool KRateDeMatch::setParams(std::uint32_t tbSize, std::uint32_t G, std::uint32_
                              std::uint32_t rvIdx, std::uint32_t numLayers) {
   // The rate-matched length per code block is counted in modulation symbols per layer:
   // without bits per symbol or layers there is nothing to divide by.
-  if (Qm == 0 || numLayers == 0 || !itsRMParams.setDataParams(tbSize, G, 0, Qm, rvIdx,
-                                                               numLayers)) {
+  if (Qm == 0 || numLayers == 0 || !itsRMParams.setDataParams(tbSize, G, 0, Qm, rvIdx, numLayers)) {
     errorLineBare("Invalid combination of parameters: tbsize, g, qm, rvidx, nlayers");
     return false;
   }
@@ -142,8 +143,8 @@ bool KRateDeMatch::blockGeometry(std::uint32_t r, BlockGeometry& g) const {
   // The interleaver must hold the D_r soft values, and the fillers are part of them; the
   // buffer of three streams must stay addressable by signed 32-bit tables.
   if (Kpi < D || F > D || 3 * Kpi > INT32_MAX) {
-    errorLineFile(kSource, __LINE__, " interleaver of ", Kpi,
-                           " positions cannot hold ", D, " soft values with ", F, " fillers");
+    errorLineFile(kSource, __LINE__, " interleaver of ", Kpi, " positions cannot hold ", D,
+                  " soft values with ", F, " fillers");
     return false;
   }
   g.D = static_cast<std::uint32_t>(D);
@@ -266,9 +267,8 @@ bool KRateDeMatch::llrCollect(const SoftValues& in, const SoftValues& nullMap, S
     return true;
   }
   if (Ncb == 0 || nullMap.size() < Ncb || in.size() < E) {
-    errorLineFile(kSource, __LINE__, " cannot collect ", E, " soft values from ",
-                           in.size(), " into a buffer of ", Ncb, " with ", nullMap.size(),
-                           " marks");
+    errorLineFile(kSource, __LINE__, " cannot collect ", E, " soft values from ", in.size(),
+                  " into a buffer of ", Ncb, " with ", nullMap.size(), " marks");
     return false;
   }
   // Walk the circular buffer from k0, giving the next soft value to every real position and
@@ -283,8 +283,7 @@ bool KRateDeMatch::llrCollect(const SoftValues& in, const SoftValues& nullMap, S
       ++m;
       skippedInARow = 0;
     } else if (++skippedInARow == Ncb) {
-      errorLineFile(kSource, __LINE__, " buffer of ", Ncb,
-                             " positions holds no real bit");
+      errorLineFile(kSource, __LINE__, " buffer of ", Ncb, " positions holds no real bit");
       return false;
     }
     if (++p == Ncb) {
@@ -305,14 +304,13 @@ bool KRateDeMatch::deinterleaveData(const SoftValues& w, const SoftValues& nullM
   d1.assign(D, 0);
   d2.assign(D, 0);
   if (w.size() != 3 * Kpi) {
-    errorLineFile(kSource, 276, " llr's size should be:", 3 * Kpi, "  size is:",
-                           w.size());
+    errorLineFile(kSource, 276, " llr's size should be:", 3 * Kpi, "  size is:", w.size());
     return false;
   }
   if (Kpi < D || nullMap.size() != 3 * Kpi || P.size() != Kpi || pi.size() != Kpi) {
     errorLineFile(kSource, __LINE__, " tables do not fit an interleaver of ", Kpi,
-                           " positions for ", D, " soft values: null map ", nullMap.size(),
-                           ", P ", P.size(), ", pi ", pi.size());
+                  " positions for ", D, " soft values: null map ", nullMap.size(), ", P ", P.size(),
+                  ", pi ", pi.size());
     return false;
   }
   const auto ND = static_cast<std::uint32_t>(Kpi - D);
@@ -349,9 +347,8 @@ bool KRateDeMatch::applyHARQ(const Streams& harqIn, const Streams& dematched, St
     const std::size_t harqSize = s < harqIn.size() ? harqIn[s].size() : 0;
     const std::size_t dematchedSize = s < dematched.size() ? dematched[s].size() : 0;
     if (harqSize < D || dematchedSize < D) {
-      errorLineFile(kSource, __LINE__, " HARQ stream ", s, " size should be at least:",
-                             D, "  harq size is:", harqSize, "  dematched size is:",
-                             dematchedSize);
+      errorLineFile(kSource, __LINE__, " HARQ stream ", s, " size should be at least:", D,
+                    "  harq size is:", harqSize, "  dematched size is:", dematchedSize);
       return false;
     }
   }
@@ -419,13 +416,12 @@ bool KRateDeMatch::deinterleaveConvData(const SoftValues& w, const SoftValues& n
   d2.assign(g.D, 0);
   const std::size_t Kpi = g.Kpi;
   if (w.size() != 3 * Kpi) {
-    errorLineFile(kSource, 361, " llr's size should be:", 3 * Kpi, "  size is:",
-                           w.size());
+    errorLineFile(kSource, 361, " llr's size should be:", 3 * Kpi, "  size is:", w.size());
     return false;
   }
   if (nullMap.size() != 3 * Kpi || P.size() != Kpi) {
     errorLineFile(kSource, __LINE__, " tables do not fit an interleaver of ", Kpi,
-                           " positions: null map ", nullMap.size(), ", P ", P.size());
+                  " positions: null map ", nullMap.size(), ", P ", P.size());
     return false;
   }
   SoftValues* const streams[3] = {&d0, &d1, &d2};
@@ -448,14 +444,13 @@ bool KRateDeMatch::combineAckRi(const SoftValues& softIn, SoftValues& combined, 
   }
   if (Q == 0) {
     errorLineFile(kSource, __LINE__,
-                           isRI ? "Need to set RI_Q parameter before calling RM data"
-                                : "Need to set ACK_Q parameter before calling RM data");
+                  isRI ? "Need to set RI_Q parameter before calling RM data"
+                       : "Need to set ACK_Q parameter before calling RM data");
     return false;
   }
   if (softIn.size() != Q) {
     errorLineFile(kSource, __LINE__,
-                           isRI ? "RI DataIn size must match RI_Q"
-                                : "ACK DataIn size must match ACK_Q");
+                  isRI ? "RI DataIn size must match RI_Q" : "ACK DataIn size must match ACK_Q");
     return false;
   }
   if (fieldSize != 1 && fieldSize != 2) {
@@ -495,8 +490,7 @@ bool KRateDeMatch::rateDematchCQI(const SoftValues& softIn, SoftValues& combined
   }
   const std::uint32_t Q = itsRMParams.cqiQ;
   if (Q == 0) {
-    errorLineFile(kSource, __LINE__,
-                           "Need to set CQI_Q parameter before calling RM data");
+    errorLineFile(kSource, __LINE__, "Need to set CQI_Q parameter before calling RM data");
     return false;
   }
   if (softIn.size() != Q) {

@@ -124,8 +124,7 @@ bool KTurboDecoderCModel::decode(const std::vector<std::int32_t>& sys,
   }
   const std::size_t N = sys.size();
   if (p1.size() != N || p2.size() != N) {
-    errorLineFile(kSource, 151,
-                           "ERROR:KTurboDecoderCModel:LLRs should all be the same size");
+    errorLineFile(kSource, 151, "ERROR:KTurboDecoderCModel:LLRs should all be the same size");
     return false;
   }
   // Streams shorter than the 4 tail positions give K = 0, which the model refuses, rather
@@ -159,8 +158,7 @@ bool KTurboDecoderCModel::decode(const std::vector<std::int32_t>& sys,
   outputs.bits_capacity = K;
   const std::int32_t code = vexlon_ip_corvane_bitacc_simulate(itsModel, inputs, &outputs);
   if (code != 0) {
-    errorLineFile(kSource, 203, "ERROR:KTurboDecoderCModel:Model returned error code ",
-                           code);
+    errorLineFile(kSource, 203, "ERROR:KTurboDecoderCModel:Model returned error code ", code);
     return false;
   }
   // A library storing more than the capacity it was given is not believed beyond it.
