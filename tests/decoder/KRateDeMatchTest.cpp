@@ -11,6 +11,7 @@
 #include <functional>
 #include <random>
 #include <regex>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -251,8 +252,9 @@ std::string checkStreams(const std::vector<const tx::Bits*>& sent, const Streams
                                           : v == count * unit && count >= std::int32_t(E / real) &&
                                      count <= std::int32_t((E + real - 1) / real);
       if (!ok) {
-        return "d" + std::to_string(s) + "[" + std::to_string(i) + "] = " + std::to_string(v) +
-               " for bit " + std::to_string(bit);
+        std::ostringstream where;  // a stream: GCC 12 at -O3 misreads chained string sums
+        where << "d" << s << "[" << i << "] = " << v << " for bit " << int{bit};
+        return where.str();
       }
       total += bit == tx::kNullBit || saturating ? 0 : count;
     }
