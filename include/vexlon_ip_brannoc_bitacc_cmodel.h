@@ -163,15 +163,38 @@ VEXLON_IP_BRANNOC_API int32_t vexlon_ip_brannoc_SCH_bitacc_simulate(
     vexlon_ip_brannoc_state *state, vexlon_ip_brannoc_SCH_inputs inputs,
     vexlon_ip_brannoc_SCH_outputs *outputs);
 
-/* Decodes one PUCCH transmission. Returns 0 on success, else a status code (500..507
-   argument checks, 600 decode failure, 701/702 output capacity, 999 an internal exception). */
+/* Decodes one PUCCH transmission (format 2/2a/2b CQI with ACK, or ACK alone). Returns 0 on
+   success, else a status code:
+     500 null state, 501 null outputs,
+     502..505 CCH_UCI_OP_SIZE > 13, CCH_CP > 1, CCH_ACK_OP_SIZE > 2, CCH_USER_ID > 65535,
+     506 the sizes do not fit the cyclic prefix (extended: CQI + ACK bits at most 13),
+     507 the LLRs could not be cached (out of memory, or llr_size beyond what this build can
+         hold),
+     508 llr null with llr_size > 0,
+     509 CCH_data_out null with CCH_UCI_OP_SIZE > 0, 510 CCH_ACK_out null with
+         CCH_ACK_OP_SIZE > 0,
+     600 the decode failed: llr_size must be 20 + ACK bits (normal cyclic prefix, or no
+         ACK), 20 (extended cyclic prefix with CQI and ACK), or at least the ACK bits (ACK
+         alone; only the first ACK-bits values are read); no CQI and no ACK bits,
+     701/702 the CQI / ACK bits exceed max_CCH_data_out_size / max_CCH_ACK_out_size (on 702
+         the CQI bits are already written),
+     999 an internal exception.
+   Codes 500..505 and 508..510 change nothing in the instance; from 506 on the decoder keeps
+   the user and sizes of this call. Nothing is written outside the caller's arrays: an array
+   is written only up to its capacity and only when bits are due. CCH_TAG_out is written on
+   success only. */
 VEXLON_IP_BRANNOC_API int32_t vexlon_ip_brannoc_CCH_bitacc_simulate(
     vexlon_ip_brannoc_state *state, vexlon_ip_brannoc_CCH_inputs inputs,
     vexlon_ip_brannoc_CCH_outputs *outputs);
 
 /* Switches on the debug dump of one key (0..32) of one channel (0 shared, 1 control) into
    the file <name><piece>.log, where name is nameLength bytes taken as they are (no
-   terminating zero needed). Returns 0 when key or channel is out of range, else 1. */
+   terminating zero needed). Returns 0, touching nothing, when key or channel is out of range,
+   state is null, or name is null with nameLength > 0; else 1, also when the file could not
+   be opened (reported by two lines; the key then writes nothing) or the control channel has
+   no dump of that key (it has keys 1, 3, 27, 28 and 32). A name holding a zero byte is
+   treated as a file that cannot be opened: no file is touched. Switching a key on again
+   closes its file and opens the new one; the old file keeps its records. */
 VEXLON_IP_BRANNOC_API uint32_t IUO_set_debugfn_state(vexlon_ip_brannoc_state *state, uint32_t key,
                                                      uint32_t channel, const char *name,
                                                      uint32_t nameLength);

@@ -79,8 +79,7 @@ template <typename T>
 void appendFormatted(std::string& out, const DumpDescriptor& descriptor, T value) {
   const std::uint32_t mode = descriptor.getMode();
   if (mode == kDumpBinary || mode == kDumpAddressBinary) {
-    fileio_detail::appendBinary(out, fileio_detail::binaryPattern(value),
-                                descriptor.getBinWidth());
+    fileio_detail::appendBinary(out, fileio_detail::binaryPattern(value), descriptor.getBinWidth());
   } else if (mode == kDumpHex || mode == kDumpAddressHex) {
     fileio_detail::appendHex(out, fileio_detail::hexPattern(value), descriptor.getHexWidth());
   }
@@ -119,8 +118,8 @@ void appendLengthLine(std::string& out, std::size_t length) {
 // A generous guess of one element line, so that a record is built without regrowing.
 std::size_t lineEstimate(const DumpDescriptor& descriptor, std::size_t columns) {
   return descriptor.getPrefix().size() + 2 * kAddressDigits +
-         columns * (descriptor.getDecWidth() + descriptor.getBinWidth() +
-                    descriptor.getHexWidth() + 8) +
+         columns *
+             (descriptor.getDecWidth() + descriptor.getBinWidth() + descriptor.getHexWidth() + 8) +
          kSeparator.size() + 1;
 }
 
@@ -394,8 +393,8 @@ bool writeArrays(const DumpDescriptor& descriptor, const std::vector<std::uint32
                  const std::vector<std::uint32_t>& array2, const std::vector<std::uint32_t>& array3,
                  const std::vector<std::uint32_t>& array4, const std::vector<std::uint32_t>& array5,
                  const std::vector<std::uint32_t>& array6, std::string_view comment) {
-  return writeArraysOf(descriptor,
-                       std::array{&array1, &array2, &array3, &array4, &array5, &array6}, comment);
+  return writeArraysOf(descriptor, std::array{&array1, &array2, &array3, &array4, &array5, &array6},
+                       comment);
 }
 
 bool openOutputFile(std::ofstream& stream, std::string_view prefix, std::string_view piece,
@@ -406,12 +405,43 @@ bool openOutputFile(std::ofstream& stream, std::string_view prefix, std::string_
   std::string name;
   name.reserve(prefix.size() + piece.size() + 4);
   name.append(prefix).append(piece).append(".log");
-  stream.open(name, std::ios::out | (append ? std::ios::app : std::ios::trunc));
-  if (stream.is_open()) {
-    return true;
+  const bool usable = name.find('\0') == std::string::npos;
+  if (usable) {
+    stream.open(name, std::ios::out | (append ? std::ios::app : std::ios::trunc));
+    if (stream.is_open()) {
+      return true;
+    }
   }
-  errorLineBare("ERROR:Could not open output file '", name, "'");
+  std::string shown;
+  for (const char c : name) {
+    shown.append(c == '\0' ? std::string_view("\\0") : std::string_view(&c, 1));
+  }
+  errorLineBare("ERROR:Could not open output file '", shown, "'");
   return false;
+}
+
+DumpDescriptor lookupDumpDescriptor(DumpTable& table, std::uint32_t key, std::uint32_t channel) {
+  return table[{key, channel}];
+}
+
+bool storeDumpDescriptor(DumpTable& table, std::uint32_t key, std::uint32_t channel,
+                         std::uint32_t tableChannel, const DumpDescriptor& descriptor) {
+  if (channel != tableChannel) {
+    return false;
+  }
+  table[{key, channel}] = descriptor;
+  return true;
+}
+
+bool openDumpFile(DumpTable& table, std::uint32_t key, std::uint32_t channel, std::ofstream& stream,
+                  std::string_view prefix, std::string_view piece) {
+  DumpDescriptor descriptor = table[{key, channel}];
+  if (!openOutputFile(stream, prefix, piece, false)) {
+    return false;
+  }
+  descriptor.setFile(&stream);
+  table[{key, channel}] = descriptor;
+  return true;
 }
 
 }  // namespace brannoc

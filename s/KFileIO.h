@@ -9,10 +9,12 @@
 #include <cstdint>
 #include <exception>
 #include <fstream>
+#include <map>
 #include <ostream>
 #include <string>
 #include <string_view>
 #include <type_traits>
+#include <utility>
 #include <vector>
 
 #include "errorLine.h"
@@ -187,9 +189,28 @@ bool writeArrays(const DumpDescriptor& descriptor, const std::vector<std::uint32
 
 // Opens prefix + piece + ".log" for writing into stream (closing it first if open), truncating
 // an existing file unless append is set. On failure prints
-// "ERROR:Could not open output file '<name>'" and returns false.
+// "ERROR:Could not open output file '<name>'" and returns false. A name holding a zero byte
+// is a failed open that touches no file: the file system would cut the name there and open
+// some other file (the line shows each zero byte as \0).
 bool openOutputFile(std::ofstream& stream, std::string_view prefix, std::string_view piece,
                     bool append);
+
+// The descriptor map of a decoder object: (dump key, channel) -> descriptor.
+using DumpTable = std::map<std::pair<std::uint32_t, std::uint32_t>, DumpDescriptor>;
+
+// The descriptor of (key, channel); a pair not yet in the map gets a default descriptor.
+DumpDescriptor lookupDumpDescriptor(DumpTable& table, std::uint32_t key, std::uint32_t channel);
+// Stores a descriptor for (key, channel) when channel is the decoder's own (tableChannel).
+bool storeDumpDescriptor(DumpTable& table, std::uint32_t key, std::uint32_t channel,
+                         std::uint32_t tableChannel, const DumpDescriptor& descriptor);
+
+// Switching a dump file on in a decoder object: looks up (key, channel) (a missing pair gets
+// a default descriptor), opens stream as prefix + piece + ".log" and, on success, stores the
+// descriptor back with the stream set. On failure the opener's line is printed, the
+// descriptor keeps whatever stream it had (now closed) and the result is false; the decoder
+// prints its own line for the key.
+bool openDumpFile(DumpTable& table, std::uint32_t key, std::uint32_t channel, std::ofstream& stream,
+                  std::string_view prefix, std::string_view piece);
 
 }  // namespace brannoc
 

@@ -1,0 +1,130 @@
+// KLTE_PUSCH_Decoding: the shared-channel (PUSCH) decoder of one library instance. It owns
+// every component that decoding a PUSCH transmission needs (CRC generator, tail-biting Viterbi
+// decoder, desegmenter, rate dematcher with its parameter set, CQI block decoder, LLR format,
+// turbo-decoder adapter) and its debug dump files, holds the configuration that the library
+// interface writes before each call, and keeps the few values that live from one call to the
+// next (the parameter sets, the interleaver rows, the subframe of the previous call).
+//
+// The interface configures it for every call in this order: the turbo adapter's processing
+// units and algorithm, setTurboIterations, setCallIdentifiers, setModulationParams,
+// setTransportBlockParams, setCQIParams, setACKParams, setRIParams; setTransportBlockParams reads
+// Qm and the number of layers that setModulationParams stored.
+#ifndef BRANNOC_KLTE_PUSCH_DECODING_H
+#define BRANNOC_KLTE_PUSCH_DECODING_H
+
+#include <array>
+#include <cstdint>
+#include <fstream>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "KCRCGenerator.h"
+#include "KDeSegment3GPPLTE.h"
+#include "KFileIO.h"
+#include "KLTE_CQI_Decoding.h"
+#include "KLTE_DecoderViterbi.h"
+#include "KQuantized.h"
+#include "KRateDeMatch.h"
+#include "KTurboDecoderCModel.h"
+
+namespace brannoc {
+
+class KLTE_PUSCH_Decoding {
+ public:
+  // Dump keys of the shared channel (channel 0), 0..32; the stream of key k is itsDumpFiles[k].
+  static constexpr std::uint32_t kNumDumpKeys = 33;
+  static constexpr std::uint32_t kChannel = 0;
+
+  // Factory: only the empty properties text is accepted; the object is built for 8:5 LLRs.
+  static std::unique_ptr<KLTE_PUSCH_Decoding> create(const std::string& properties);
+
+  // Any width text other than "8:5" is warned about; the LLR format is 8:5 whatever it says.
+  explicit KLTE_PUSCH_Decoding(const std::string& llrWidth);
+  ~KLTE_PUSCH_Decoding();
+
+  KLTE_PUSCH_Decoding(const KLTE_PUSCH_Decoding&) = delete;
+  KLTE_PUSCH_Decoding& operator=(const KLTE_PUSCH_Decoding&) = delete;
+
+  // Setters: each refuses (one line, false, nothing changed) while the shared channel is not
+  // enabled. See the class comment for the order the interface calls them in.
+  bool setModulationParams(std::uint32_t totalBits, std::uint32_t Qm, std::uint32_t numLayers,
+                           std::uint32_t cpType);
+  // The third argument is ignored: Qm and the layers come from setModulationParams.
+  bool setTransportBlockParams(std::uint32_t tbSize, std::uint32_t G, std::uint32_t qm,
+                               std::uint32_t rvIdx, std::uint32_t turboFlush);
+  bool setCQIParams(std::uint32_t cqiSize, std::uint32_t cqiQ, std::uint32_t numCQIPU);
+  bool setACKParams(std::uint32_t ackSize, std::uint32_t ackQ);
+  bool setRIParams(std::uint32_t riSize, std::uint32_t riQ);
+  // 1..16; anything else is refused without a line (the interface prints its own).
+  bool setTurboIterations(std::int32_t iterations);
+
+  // G: the rate-matched data soft values of all code blocks (E0 up to Eidx, E1 after).
+  std::uint32_t getDataLength() const;
+  // The HARQ buffer length of one stream: the sum of K_r + 4 over the code blocks.
+  std::uint32_t getHarqLength() const;
+
+  // Debug dumps: switches the file of (key, channel 0) on under prefix; the descriptor of a
+  // (key, channel) pair (a pair not in the map gets a default one); storing a descriptor is
+  // accepted for channel 0 only.
+  bool openDumpFile(std::uint32_t key, std::uint32_t channel, std::string_view prefix);
+  DumpDescriptor getDumpDescriptor(std::uint32_t key, std::uint32_t channel);
+  bool setDumpDescriptor(std::uint32_t key, std::uint32_t channel,
+                         const DumpDescriptor& descriptor);
+
+  KTurboDecoderCModel& turboDecoder() { return itsTurboDecoder; }
+  const KRateDeMatch& rateDematcher() const { return itsRateDematch; }
+  const KDeSegment3GPPLTE& deSegmenter() const { return itsDeSegment; }
+  const KLTE_CQI_Decoding& cqiDecoder() const { return itsCQIDecoder; }
+  const KQuantized& llrFormat() const { return itsLLRFormat; }
+  std::uint32_t getNumColumns() const { return itsNumColumns; }
+  std::uint32_t getNumRows() const { return itsNumRows; }
+  std::uint32_t getTurboFlush() const { return itsTurboFlush; }
+  std::uint32_t getTurboIterations() const { return itsTurboIterations; }
+
+  // The per-call identifiers of the status words: the user (low 16 bits kept), the SCH_HFC
+  // flag and the subframe (4 bits); the subframe held so far becomes the HARQ subframe.
+  void setCallIdentifiers(std::uint32_t userId, bool hfc, std::uint32_t subframe);
+  std::uint32_t getUserId() const { return itsUserId; }
+  std::uint32_t getSubframeId() const { return itsSubframeId; }
+  std::uint32_t getHarqSubframeId() const { return itsHarqSubframeId; }
+  bool getHFC() const { return itsHFC; }
+
+ private:
+  // Prints "../s/KLTE_PUSCH_Decoding(line)Error: SCH channel is not enabled. " and returns
+  // false when the shared channel is off.
+  bool channelEnabled(unsigned line) const;
+  void fillDumpTable();
+
+  std::array<std::ofstream, 37> itsDumpFiles;  // keys 0..32; the last four have no key
+  DumpTable itsDumpTable;
+  KCRCGenerator itsCRCGenerator;
+  KLTE_DecoderViterbi itsViterbi;
+  KDeSegment3GPPLTE itsDeSegment;
+  KRateDeMatch itsRateDematch;
+  KLTE_CQI_Decoding itsCQIDecoder;
+  KQuantized itsLLRFormat;
+  std::uint32_t itsNumColumns = 14;  // Cmux: 12 normal, 10 extended cyclic prefix
+  std::uint32_t itsNumRows = 0;      // R'mux, written by each deinterleave
+  std::uint32_t itsTurboFlush = 0;
+  // No operation changes these: data, CQI, ACK and RI are always enabled, and what is really
+  // present follows from the sizes.
+  bool itsSCHEnabled = true;
+  bool itsDataEnabled = true;
+  bool itsCQIEnabled = true;
+  bool itsRIEnabled = true;
+  bool itsACKEnabled = true;
+  bool itsHFC = false;
+  std::string itsLengthOption;           // register options: "LONG" / "SHORT"
+  std::string itsIdOption;               // "USERID" / "SFRMID" / "CBID"
+  std::uint32_t itsTurboIterations = 7;  // 1..16
+  std::uint32_t itsUserId = 0;           // 16 bits used
+  std::uint32_t itsSubframeId = 0;       // 4 bits
+  std::uint32_t itsHarqSubframeId = 0;   // the subframe of the previous call
+  bool itsCombineHARQ = false;           // the current call is a retransmission
+  KTurboDecoderCModel itsTurboDecoder;
+};
+
+}  // namespace brannoc
+
+#endif  // BRANNOC_KLTE_PUSCH_DECODING_H
