@@ -18,6 +18,7 @@
 #include <memory>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "KCRCGenerator.h"
 #include "KDeSegment3GPPLTE.h"
@@ -32,6 +33,25 @@ namespace brannoc {
 
 class KLTE_PUSCH_Decoding {
  public:
+  using SoftValues = std::vector<std::int32_t>;
+  using Bits = std::vector<std::uint8_t>;
+  using Streams = KRateDeMatch::Streams;  // d0, d1, d2
+  using RegisterImage = std::vector<std::uint64_t>;
+
+  // Everything one shared-channel decode produces.
+  struct SCHResults {
+    Streams harqOut;          // the combined soft values of all blocks, stream by stream
+    Bits tbOut;               // the transport block without its CRC
+    Bits cqiOut;              // the CQI report
+    Bits riOut;               // the RI bits
+    Bits ackOut;              // the HARQ-ACK bits
+    std::uint8_t tbCrcPass = 0;
+    Bits crc_CWs;             // per code block: 1 when its CRC matched (0 for a lone block)
+    std::uint8_t ackFlag = 0; // 2-bit ACK parity failed
+    std::uint8_t riFlag = 0;  // 2-bit RI parity failed
+    std::uint8_t cqiCrcPass = 0;  // 0 no CQI, 1 block code, else the CRC8 outcome
+  };
+
   // Dump keys of the shared channel (channel 0), 0..32; the stream of key k is itsDumpFiles[k].
   static constexpr std::uint32_t kNumDumpKeys = 33;
   static constexpr std::uint32_t kChannel = 0;
@@ -64,6 +84,57 @@ class KLTE_PUSCH_Decoding {
   // The HARQ buffer length of one stream: the sum of K_r + 4 over the code blocks.
   std::uint32_t getHarqLength() const;
 
+  // The whole decode of one transmission: deinterleaving and demultiplexing, the data chain
+  // (with HARQ combining when retransmission is set; harqIn is then three streams of
+  // getHarqLength() values), CQI, ACK and RI, dumps and register images.
+  bool decodeSCH(bool retransmission, const SoftValues& llrInput, const Streams& harqIn,
+                 SCHResults& results);
+
+  // TS 36.212 5.2.2.8 undone: the H soft values of the transmission back into the matrix of
+  // R'mux rows and Cmux columns, the ACK and RI symbols taken out of their columns, and the
+  // rest read row by row into the CQI-and-data stream (ACK positions as 0, RI left out).
+  bool channelDeinterleave(const SoftValues& input, SoftValues& cqiData, SoftValues& ri,
+                           SoftValues& ack);
+
+  // The data chain of TS 36.212 5.1 undone: slicing and saturation per code block,
+  // rate dematching, HARQ combining (itsCombineHARQ), turbo decoding, code-block and
+  // transport-block CRCs. combined receives the combined streams of every block.
+  bool decodeData(const SoftValues& data, const Streams& harqIn, Streams& harqOut,
+                  std::vector<Streams>& combined, Bits& tbOut, std::uint8_t& tbCrcPass,
+                  Bits& crc_CWs);
+  bool decodeNewData(const SoftValues& data, Streams& harqOut, std::vector<Streams>& combined,
+                     Bits& tbOut, std::uint8_t& tbCrcPass, Bits& crc_CWs);
+  bool decodeRetransmission(const SoftValues& data, const Streams& harqIn, Streams& harqOut,
+                            std::vector<Streams>& combined, Bits& tbOut,
+                            std::uint8_t& tbCrcPass, Bits& crc_CWs);
+  // The HARQ input given per code block (C entries of three streams), joined and decoded.
+  bool decodeDataCWs(const SoftValues& data, const std::vector<Streams>& harqIn_CWs,
+                     Streams& harqOut, std::vector<Streams>& combined, Bits& tbOut,
+                     std::uint8_t& tbCrcPass, Bits& crc_CWs);
+  // One code block's three streams through the turbo-decoder adapter.
+  bool turboDecodeCodeBlock(const Streams& streams, Bits& bits, std::uint32_t iterations);
+
+  // CQI on PUSCH (TS 36.212 5.2.2.6.4): the (32,O) block code for O up to 11 bits, else the
+  // CRC8 and tail-biting convolutional code through the Viterbi decoder.
+  bool decodeCQI(const SoftValues& softIn, Bits& cqiBits, std::uint8_t& cqiStatus);
+  // d0, d1, d2 quantised to 4-bit offset binary with a zero soft value as an erasure, then
+  // decoded; extendedRxData receives the decoder's six extended inputs for the dumps.
+  bool viterbiDecodeCQI(const SoftValues& d0, const SoftValues& d1, const SoftValues& d2,
+                        Bits& decodedBits, KLTE_DecoderViterbi::ExtendedRxData& extendedRxData);
+  // HARQ-ACK and RI on PUSCH (TS 36.212 5.2.2.6): repetitions combined, bits decided by sign,
+  // the parity of a 2-bit field checked into the flag.
+  bool decodeACK(const SoftValues& softIn, Bits& ackBits, std::uint8_t& parityError);
+  bool decodeRI(const SoftValues& softIn, Bits& riBits, std::uint8_t& parityError);
+  bool decodeACKRIBits(const SoftValues& combined, Bits& bits, std::uint8_t& parityError) const;
+
+  // Register images of the core (dumps only): MEM_MAP_CTRL_UL_RX_DEC_SCH (9 words), one data
+  // status word per code block, the CQI, RI and ACK status words.
+  bool packControlRegister(RegisterImage& image) const;
+  bool packDataStatus(const Bits& crc_CWs, std::uint8_t tbCrcPass, RegisterImage& words) const;
+  bool packCQIStatus(std::uint8_t cqiCrcPass, const Bits& data_CQI, RegisterImage& words) const;
+  bool packRIStatus(std::uint8_t riFlag, const Bits& riBits, RegisterImage& words) const;
+  bool packACKStatus(std::uint8_t ackFlag, const Bits& ackBits, RegisterImage& words) const;
+
   // Debug dumps: switches the file of (key, channel 0) on under prefix; the descriptor of a
   // (key, channel) pair (a pair not in the map gets a default one); storing a descriptor is
   // accepted for channel 0 only.
@@ -95,6 +166,22 @@ class KLTE_PUSCH_Decoding {
   // false when the shared channel is off.
   bool channelEnabled(unsigned line) const;
   void fillDumpTable();
+  // Writes a record when the key's file is open (the record is built only then).
+  void dump(std::uint32_t key, const Bits& bits, std::string_view comment);
+  void dump(std::uint32_t key, const SoftValues& values, std::string_view comment);
+  void dump(std::uint32_t key, const RegisterImage& words, std::string_view comment);
+  void dump(std::uint32_t key, const Streams& streams, std::string_view comment);
+  bool dumpOpen(std::uint32_t key);
+  // The per-block loops of decodeData: each runs over every block and ANDs the results.
+  bool rateDematchCodeBlocks(const std::vector<SoftValues>& blocks, std::vector<Streams>& dematched);
+  bool applyHARQCodeBlocks(const std::vector<Streams>& harqBlocks,
+                           const std::vector<Streams>& dematched, std::vector<Streams>& combined);
+  bool turboDecodeCodeBlocks(const std::vector<Streams>& combined, std::vector<Bits>& decoded);
+  bool removeCodeBlockCRCs(const std::vector<Bits>& decoded, std::vector<Bits>& stripped,
+                           Bits& crc_CWs);
+  bool decodeACKorRI(bool isRI, const SoftValues& softIn, Bits& bits, std::uint8_t& parityError);
+  void packUciStatus(std::uint32_t size, std::uint8_t flag, const Bits& bits, unsigned line,
+                     RegisterImage& words) const;
 
   std::array<std::ofstream, 37> itsDumpFiles;  // keys 0..32; the last four have no key
   DumpTable itsDumpTable;

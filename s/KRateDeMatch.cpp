@@ -3,6 +3,7 @@
 // short CQI repetitions (clause 5.2.2.6), with 8:5 saturation of every sum.
 #include "KRateDeMatch.h"
 
+#include <algorithm>
 #include <array>
 #include <string_view>
 
@@ -39,25 +40,6 @@ const std::array<std::int32_t, 32>* columnPattern(std::uint32_t mode) {
 constexpr std::int32_t kReal = 0;
 constexpr std::int32_t kDummy = 1;
 constexpr std::int32_t kFiller = 2;
-
-// The sum of two soft values as the core's adder forms it: each operand is clamped into the
-// register format, the sum is exact one integer bit wider, and narrowing back to the
-// format's integer width saturates it. The HARQ path also moves the sum back to the
-// register's full format (which leaves the value as it is). The quantizer results are not
-// needed: saturation is the intended behaviour, not a failure.
-std::int32_t saturatedSum(const KQuantized& format, std::int32_t a, std::int32_t b,
-                          bool backToFormat) {
-  KQuantized x(format);
-  x.setValueQ(a);
-  KQuantized y(format);
-  y.setValueQ(b);
-  KQuantized sum = x + y;
-  sum.setNINTBITS(format.getNINTBITS());
-  if (backToFormat) {
-    sum.changeFormat(format.getNINTBITS(), format.getNFRACBITS());
-  }
-  return static_cast<std::int32_t>(sum.getValueQ());
-}
 
 // Geometry of the convolutionally coded CQI: D = O + 8 (the CRC8), 32-column interleaver.
 struct ConvGeometry {
@@ -133,7 +115,33 @@ std::uint32_t KRateDeMatch::getCodeBlockE(std::uint32_t r) const {
   return r <= itsRMParams.Eidx ? itsRMParams.E0 : itsRMParams.E1;
 }
 
+// The quantizer results are not needed: saturation is the intended behaviour, not a
+// failure. Moving the sum back to the full format leaves its value as it is.
+std::int32_t KRateDeMatch::saturatedSum(const KQuantized& format, std::int32_t a, std::int32_t b) {
+  KQuantized x(format);
+  x.setValueQ(a);
+  KQuantized y(format);
+  y.setValueQ(b);
+  KQuantized sum = x + y;
+  sum.setNINTBITS(format.getNINTBITS());
+  sum.changeFormat(format.getNINTBITS(), format.getNFRACBITS());
+  return static_cast<std::int32_t>(sum.getValueQ());
+}
+
 bool KRateDeMatch::blockGeometry(std::uint32_t r, BlockGeometry& g) const {
+  if (computeBlockGeometry(r, g)) {
+    return true;
+  }
+  const segmentationParams& seg = itsRMParams.seg;
+  const bool minus = r < seg.Cminus;
+  errorLineFile(kSource, __LINE__, " interleaver of ",
+                32 * std::uint64_t{minus ? itsRMParams.rowMinus : itsRMParams.rowPlus},
+                " positions cannot hold ", std::uint64_t{minus ? seg.Kminus : seg.Kplus} + 4,
+                " soft values with ", r == 0 ? seg.F : 0, " fillers");
+  return false;
+}
+
+bool KRateDeMatch::computeBlockGeometry(std::uint32_t r, BlockGeometry& g) const {
   const segmentationParams& seg = itsRMParams.seg;
   const bool minus = r < seg.Cminus;
   const std::uint64_t D = std::uint64_t{minus ? seg.Kminus : seg.Kplus} + 4;
@@ -143,8 +151,6 @@ bool KRateDeMatch::blockGeometry(std::uint32_t r, BlockGeometry& g) const {
   // The interleaver must hold the D_r soft values, and the fillers are part of them; the
   // buffer of three streams must stay addressable by signed 32-bit tables.
   if (Kpi < D || F > D || 3 * Kpi > INT32_MAX) {
-    errorLineFile(kSource, __LINE__, " interleaver of ", Kpi, " positions cannot hold ", D,
-                  " soft values with ", F, " fillers");
     return false;
   }
   g.D = static_cast<std::uint32_t>(D);
@@ -155,7 +161,87 @@ bool KRateDeMatch::blockGeometry(std::uint32_t r, BlockGeometry& g) const {
   return true;
 }
 
+const KRateDeMatch::DematchMap* KRateDeMatch::dematchMap(std::uint32_t r) {
+  BlockGeometry g;
+  if (!computeBlockGeometry(r, g) || g.D > kIndexMask) {
+    return nullptr;
+  }
+  const bool minus = r < itsRMParams.seg.Cminus;
+  const std::uint32_t Ncb = minus ? itsRMParams.NcbMinus : itsRMParams.NcbPlus;
+  for (const DematchMap& map : itsMaps) {
+    if (map.D == g.D && map.R == g.R && map.F == g.F && map.Ncb == Ncb) {
+      return &map;
+    }
+  }
+  // Only the whole circular buffer (no soft-buffer limit) is handled here.
+  if (Ncb != 3 * g.Kpi) {
+    return nullptr;
+  }
+  SoftValues nullMap;
+  SoftValues P;
+  SoftValues pi;
+  if (!createInterleavingTables(0, r, nullMap, P, pi)) {
+    return nullptr;
+  }
+  DematchMap map;
+  map.D = g.D;
+  map.R = g.R;
+  map.F = g.F;
+  map.Ncb = Ncb;
+  auto place = [&g](std::uint32_t stream, std::int32_t y) {
+    return stream << kStreamShift | (static_cast<std::uint32_t>(y) - g.ND);
+  };
+  for (std::uint32_t p = 0; p < Ncb; ++p) {
+    const std::uint32_t k = p < g.Kpi ? p : (p - g.Kpi) / 2;
+    const std::uint32_t stream = p < g.Kpi ? 0 : 1 + (p - g.Kpi) % 2;
+    const std::uint32_t target = place(stream, stream == 2 ? pi[k] : P[k]);
+    if (nullMap[p] == kReal) {
+      map.position.push_back(p);
+      map.target.push_back(target);
+    } else if (nullMap[p] == kFiller) {
+      map.fillers.push_back(target);
+    }
+  }
+  if (map.position.empty()) {
+    return nullptr;
+  }
+  if (itsMaps.size() == 4) {
+    itsMaps.erase(itsMaps.begin());
+  }
+  itsMaps.push_back(std::move(map));
+  return &itsMaps.back();
+}
+
 bool KRateDeMatch::rateDematchData(const SoftValues& in, Streams& out, std::uint32_t r) {
+  const DematchMap* map = itsParamsSet && in.size() == getCodeBlockE(r) ? dematchMap(r) : nullptr;
+  if (map == nullptr) {
+    return rateDematchDataReference(in, out, r);
+  }
+  out.assign(3, SoftValues(map->D, 0));
+  std::int32_t* const streams[3] = {out[0].data(), out[1].data(), out[2].data()};
+  const std::int64_t minQ = itsChaseFormat.getMinQ();
+  const std::int64_t maxQ = itsChaseFormat.getMaxQ();
+  for (const std::uint32_t target : map->fillers) {
+    streams[target >> kStreamShift][target & kIndexMask] = static_cast<std::int32_t>(minQ);
+  }
+  // The walk starts at the first real position at or after k0 and wraps around the buffer.
+  const bool minus = r < itsRMParams.seg.Cminus;
+  const std::uint32_t k0 = (minus ? itsRMParams.k0_0 : itsRMParams.k0_1) % map->Ncb;
+  const std::size_t count = map->position.size();
+  std::size_t n = static_cast<std::size_t>(
+      std::lower_bound(map->position.begin(), map->position.end(), k0) - map->position.begin());
+  for (const std::int32_t value : in) {
+    if (n == count) {
+      n = 0;
+    }
+    const std::uint32_t target = map->target[n++];
+    std::int32_t& acc = streams[target >> kStreamShift][target & kIndexMask];
+    acc = saturatingAdd(value, acc, minQ, maxQ);
+  }
+  return true;
+}
+
+bool KRateDeMatch::rateDematchDataReference(const SoftValues& in, Streams& out, std::uint32_t r) {
   out.assign(3, SoftValues());
   if (!itsParamsSet) {
     errorLineBare("Need to set RM parameters before calling RM data");
@@ -279,7 +365,7 @@ bool KRateDeMatch::llrCollect(const SoftValues& in, const SoftValues& nullMap, S
   std::uint32_t m = 0;
   while (m < E) {
     if (nullMap[p] == kReal) {
-      w[p] = saturatedSum(itsChaseFormat, in[m], w[p], false);
+      w[p] = saturatingAdd(in[m], w[p], itsChaseFormat.getMinQ(), itsChaseFormat.getMaxQ());
       ++m;
       skippedInARow = 0;
     } else if (++skippedInARow == Ncb) {
@@ -352,9 +438,11 @@ bool KRateDeMatch::applyHARQ(const Streams& harqIn, const Streams& dematched, St
       return false;
     }
   }
-  for (std::size_t i = 0; i < D; ++i) {
-    for (std::size_t s = 0; s < 3; ++s) {
-      out[s][i] = saturatedSum(itsHarqFormat, dematched[s][i], harqIn[s][i], true);
+  const std::int64_t minQ = itsHarqFormat.getMinQ();
+  const std::int64_t maxQ = itsHarqFormat.getMaxQ();
+  for (std::size_t s = 0; s < 3; ++s) {
+    for (std::size_t i = 0; i < D; ++i) {
+      out[s][i] = saturatingAdd(dematched[s][i], harqIn[s][i], minQ, maxQ);
     }
   }
   return true;
@@ -470,7 +558,7 @@ bool KRateDeMatch::combineAckRi(const SoftValues& softIn, SoftValues& combined, 
   combined.assign(P, 0);
   for (std::size_t i = 0; i < softIn.size(); ++i) {
     std::int32_t& acc = combined[i % P];
-    acc = saturatedSum(itsChaseFormat, softIn[i], acc, false);
+    acc = saturatingAdd(softIn[i], acc, itsChaseFormat.getMinQ(), itsChaseFormat.getMaxQ());
   }
   return true;
 }
@@ -502,7 +590,7 @@ bool KRateDeMatch::rateDematchCQI(const SoftValues& softIn, SoftValues& combined
   combined.assign(kCodeLength, 0);
   for (std::size_t i = 0; i < softIn.size(); ++i) {
     std::int32_t& acc = combined[i % kCodeLength];
-    acc = saturatedSum(itsChaseFormat, softIn[i], acc, false);
+    acc = saturatingAdd(softIn[i], acc, itsChaseFormat.getMinQ(), itsChaseFormat.getMaxQ());
   }
   return true;
 }

@@ -56,12 +56,15 @@ class KRateDeMatch {
   // E_r: the rate-matched soft values of code block r in this transmission.
   std::uint32_t getCodeBlockE(std::uint32_t r) const;
 
-  // E_r soft values of code block r -> its three streams.
+  // E_r soft values of code block r -> its three streams. The soft values are scattered
+  // straight to their stream positions through a map of the block's circular buffer, kept
+  // for the next blocks and calls of the same geometry; rateDematchDataReference is the
+  // step-by-step form (tables, llrCollect, deinterleaveData) it must equal.
   bool rateDematchData(const SoftValues& in, Streams& out, std::uint32_t r);
+  bool rateDematchDataReference(const SoftValues& in, Streams& out, std::uint32_t r);
   // Chase combining: out[s][i] = sat(dematched[s][i] + harqIn[s][i]) for the D_r values of
   // each stream.
-  bool applyHARQ(const Streams& harqIn, const Streams& dematched, Streams& out,
-                 std::uint32_t r);
+  bool applyHARQ(const Streams& harqIn, const Streams& dematched, Streams& out, std::uint32_t r);
   bool rateDematchAndHARQ(const SoftValues& in, const Streams& harqIn, Streams& out,
                           std::uint32_t r);
 
@@ -79,17 +82,28 @@ class KRateDeMatch {
                                 SoftValues& P, SoftValues& pi) const;
   // The same for the convolutionally coded CQI block: the three streams follow one another
   // in the buffer and share P.
-  bool createConvInterleavingTables(std::uint32_t mode, SoftValues& nullMap,
-                                    SoftValues& P) const;
+  bool createConvInterleavingTables(std::uint32_t mode, SoftValues& nullMap, SoftValues& P) const;
   // Inverse bit selection: w = Ncb positions, in[m] added (saturating) at the m-th real
   // position met from k0 on, wrapping around the buffer.
-  bool llrCollect(const SoftValues& in, const SoftValues& nullMap, SoftValues& w,
-                  std::uint32_t k0, std::uint32_t Ncb, std::uint32_t E) const;
+  bool llrCollect(const SoftValues& in, const SoftValues& nullMap, SoftValues& w, std::uint32_t k0,
+                  std::uint32_t Ncb, std::uint32_t E) const;
   bool deinterleaveData(const SoftValues& w, const SoftValues& nullMap, const SoftValues& P,
                         const SoftValues& pi, SoftValues& d0, SoftValues& d1, SoftValues& d2,
                         std::uint32_t r) const;
   bool deinterleaveConvData(const SoftValues& w, const SoftValues& nullMap, const SoftValues& P,
                             SoftValues& d0, SoftValues& d1, SoftValues& d2) const;
+
+  // The core's adder of two soft values in a register format: each operand clamped into the
+  // format, the exact sum narrowed back with saturation. saturatedSum forms it with KQuantized
+  // as the hardware description does; saturatingAdd is its integer form, used everywhere.
+  static std::int32_t saturatedSum(const KQuantized& format, std::int32_t a, std::int32_t b);
+  static std::int32_t saturatingAdd(std::int32_t a, std::int32_t b, std::int64_t minQ,
+                                    std::int64_t maxQ) {
+    const std::int64_t x = a < minQ ? minQ : (a > maxQ ? maxQ : a);
+    const std::int64_t y = b < minQ ? minQ : (b > maxQ ? maxQ : b);
+    const std::int64_t sum = x + y;
+    return static_cast<std::int32_t>(sum < minQ ? minQ : (sum > maxQ ? maxQ : sum));
+  }
 
   // Repetitions of the RI, HARQ-ACK and short CQI fields summed onto Qm (1-bit field) or
   // 3 * Qm (2-bit field) accumulators, and 32 for the CQI.
@@ -108,6 +122,23 @@ class KRateDeMatch {
   };
   // False (after a line) when the parameters give no room for D_r values and the fillers.
   bool blockGeometry(std::uint32_t r, BlockGeometry& g) const;
+  // The same without the line.
+  bool computeBlockGeometry(std::uint32_t r, BlockGeometry& g) const;
+
+  // Where each real position of a code block's circular buffer lands: position[n] is the
+  // n-th real buffer position, target[n] its stream (bits 31..30) and index; fillers lists
+  // the stream positions of the filler bits.
+  struct DematchMap {
+    std::uint32_t D = 0, R = 0, F = 0, Ncb = 0;
+    std::vector<std::uint32_t> position;
+    std::vector<std::uint32_t> target;
+    std::vector<std::uint32_t> fillers;
+  };
+  static constexpr std::uint32_t kStreamShift = 30;
+  static constexpr std::uint32_t kIndexMask = (1U << kStreamShift) - 1;
+  // The map of code block r, built on first use; null when the block's geometry is one the
+  // reference path must report on.
+  const DematchMap* dematchMap(std::uint32_t r);
 
   // Accumulation onto P = Qm or 3 * Qm positions, shared by the RI and ACK fields.
   bool combineAckRi(const SoftValues& softIn, SoftValues& combined, std::uint32_t Q,
@@ -115,8 +146,9 @@ class KRateDeMatch {
 
   bool itsParamsSet;
   rateMatchParams itsRMParams;
-  KQuantized itsChaseFormat;  // saturation of repeated soft values in one transmission
-  KQuantized itsHarqFormat;   // saturation of the HARQ soft buffer
+  KQuantized itsChaseFormat;        // saturation of repeated soft values in one transmission
+  KQuantized itsHarqFormat;         // saturation of the HARQ soft buffer
+  std::vector<DematchMap> itsMaps;  // the maps of the geometries met lately
 };
 
 }  // namespace brannoc
