@@ -13,13 +13,49 @@ std::unique_ptr<KCRCGenerator> KCRCGenerator::create(const std::string& properti
   return std::make_unique<KCRCGenerator>();
 }
 
-void KCRCGenerator::setPolynomial(std::uint32_t length,
-                                  std::initializer_list<std::uint32_t> ones) {
+void KCRCGenerator::setPolynomial(std::uint32_t length, std::initializer_list<std::uint32_t> ones) {
   itsPolynomial.assign(length + 1, 0);
   for (std::uint32_t power : ones) {
     itsPolynomial[power] = 1;
   }
   itsLength = length;
+  itsTaps = 0;
+  for (std::uint32_t j = 0; j < length; ++j) {
+    itsTaps |= static_cast<std::uint32_t>(itsPolynomial[j]) << j;
+  }
+  // Entry b: the register after eight message bits whose exclusive-or with the register's
+  // top eight bits is b, from a register holding only those.
+  const std::uint32_t top = 1U << (length - 1);
+  const std::uint32_t mask = length == 32 ? 0xFFFFFFFFU : (1U << length) - 1U;
+  for (std::uint32_t b = 0; b < 256; ++b) {
+    std::uint32_t reg = b << (length - 8);
+    for (int k = 0; k < 8; ++k) {
+      reg = (reg & top) != 0 ? ((reg << 1) ^ itsTaps) & mask : (reg << 1) & mask;
+    }
+    itsByteTable[b] = reg;
+  }
+}
+
+std::uint32_t KCRCGenerator::remainder(const std::uint8_t* bits, std::size_t n) const {
+  const std::uint32_t L = itsLength;
+  const std::uint32_t mask = L == 32 ? 0xFFFFFFFFU : (1U << L) - 1U;
+  std::uint32_t reg = 0;
+  std::size_t i = 0;
+  for (; i + 8 <= n; i += 8) {
+    std::uint32_t byte = 0;
+    for (std::size_t k = 0; k < 8; ++k) {
+      byte = (byte << 1) | (bits[i + k] & 1U);
+    }
+    reg = ((reg << 8) & mask) ^ itsByteTable[((reg >> (L - 8)) ^ byte) & 0xFFU];
+  }
+  for (; i < n; ++i) {
+    const bool feedback = (((reg >> (L - 1)) ^ bits[i]) & 1U) != 0;
+    reg = (reg << 1) & mask;
+    if (feedback) {
+      reg ^= itsTaps;
+    }
+  }
+  return reg;
 }
 
 // gCRC24A(D) = D^24 + D^23 + D^18 + D^17 + D^14 + D^11 + D^10 + D^7 + D^6 + D^5 + D^4 + D^3 + D + 1
@@ -43,32 +79,13 @@ bool KCRCGenerator::generate(const std::vector<std::uint8_t>& dataBits,
   }
   const std::size_t n = dataBits.size();
   const std::uint32_t L = itsLength;
-  codedBits.clear();
-  codedBits.reserve(n + L);
-  for (std::uint8_t bit : dataBits) {
-    codedBits.push_back(bit & 1u);
-  }
-  codedBits.resize(n + L, 0);
-
-  // The remainder register as a word: bit j is the coefficient of x^j. The generator's
-  // low L coefficients are the feedback taps.
-  std::uint32_t taps = 0;
-  for (std::uint32_t j = 0; j < L; ++j) {
-    taps |= static_cast<std::uint32_t>(itsPolynomial[j] & 1u) << j;
-  }
-  const std::uint32_t top = 1u << (L - 1);
-  const std::uint32_t mask = (L == 32) ? 0xFFFFFFFFu : ((1u << L) - 1u);
-  std::uint32_t remainder = 0;
-  for (std::uint8_t bit : codedBits) {
-    const bool feedback = (remainder & top) != 0;
-    remainder = ((remainder << 1) | bit) & mask;
-    if (feedback) {
-      remainder ^= taps;
-    }
+  const std::uint32_t parity = remainder(dataBits.data(), n);
+  codedBits.resize(n + L);
+  for (std::size_t i = 0; i < n; ++i) {
+    codedBits[i] = dataBits[i] & 1U;
   }
   for (std::uint32_t i = 0; i < L; ++i) {
-    const std::uint32_t parity = (remainder >> (L - 1 - i)) & 1u;
-    codedBits[n + i] = static_cast<std::uint8_t>(parity ^ ((crcMask >> i) & 1u));
+    codedBits[n + i] = static_cast<std::uint8_t>(((parity >> (L - 1 - i)) ^ (crcMask >> i)) & 1U);
   }
   return true;
 }
@@ -76,14 +93,24 @@ bool KCRCGenerator::generate(const std::vector<std::uint8_t>& dataBits,
 bool KCRCGenerator::check(const std::vector<std::uint8_t>& codedBits,
                           std::vector<std::uint8_t>& dataBits, std::uint8_t& crcPass,
                           std::uint32_t crcMask) const {
-  dataBits = codedBits;
-  if (itsLength == 0 || codedBits.size() <= itsLength) {
+  const std::uint32_t L = itsLength;
+  if (L == 0 || codedBits.size() <= L) {
+    dataBits = codedBits;
     return false;
   }
-  dataBits.resize(codedBits.size() - itsLength);
-  std::vector<std::uint8_t> regenerated;
-  generate(dataBits, regenerated, crcMask);
-  crcPass = (regenerated == codedBits) ? 1 : 0;
+  const std::size_t n = codedBits.size() - L;
+  dataBits.assign(codedBits.begin(), codedBits.begin() + static_cast<std::ptrdiff_t>(n));
+  // The received parity must equal the one generated from the received data; the data bits
+  // themselves are compared as generate writes them (their low bit).
+  const std::uint32_t parity = remainder(codedBits.data(), n);
+  bool pass = true;
+  for (std::size_t i = 0; i < n && pass; ++i) {
+    pass = codedBits[i] <= 1;
+  }
+  for (std::uint32_t i = 0; i < L && pass; ++i) {
+    pass = codedBits[n + i] == (((parity >> (L - 1 - i)) ^ (crcMask >> i)) & 1U);
+  }
+  crcPass = pass ? 1 : 0;
   return true;
 }
 

@@ -1,11 +1,13 @@
 // KCRCGenerator: the cyclic redundancy checks of the LTE uplink (TS 36.212 clause 5.1.1):
 // gCRC24A for transport blocks, gCRC24B for code blocks of a segmented transport block,
-// gCRC8 for CQI reports of more than 11 bits on PUSCH, and gCRC16. Bit-serial division
-// over GF(2) with a zero initial register and no final inversion; the parity is written
-// highest power first (p0, p1, ... of the standard).
+// gCRC8 for CQI reports of more than 11 bits on PUSCH, and gCRC16. Division over GF(2) with
+// a zero initial register and no final inversion, eight bits a step through a table; the
+// parity is written highest power first (p0, p1, ... of the standard).
 #ifndef BRANNOC_KCRCGENERATOR_H
 #define BRANNOC_KCRCGENERATOR_H
 
+#include <array>
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -41,9 +43,15 @@ class KCRCGenerator {
   // Selects the generator of degree length whose coefficients listed are 1 (x^length is
   // always 1).
   void setPolynomial(std::uint32_t length, std::initializer_list<std::uint32_t> ones);
+  // The remainder of a(x) x^L divided by the generator, a(x) being the low bits of n elements
+  // (highest power first); bit j of the result is the coefficient of x^j.
+  std::uint32_t remainder(const std::uint8_t* bits, std::size_t n) const;
 
   std::vector<std::uint8_t> itsPolynomial;  // entry j: coefficient of x^j, L + 1 entries
   std::uint32_t itsLength = 0;              // L, the number of parity bits
+  std::uint32_t itsTaps = 0;                // the generator's low L coefficients as a word
+  // The remainder step of eight message bits at once, indexed by the bits entering it.
+  std::array<std::uint32_t, 256> itsByteTable{};
 };
 
 }  // namespace brannoc

@@ -74,9 +74,7 @@ std::uint32_t basisColumn(std::uint32_t type, std::uint32_t n) {
 
 KLTE_CQI_Decoding::KLTE_CQI_Decoding() : itsCQIType(CQI_TYPE_PUCCH), itsNumBits(0), itsNumPU(1) {}
 
-KLTE_CQI_Decoding::KLTE_CQI_Decoding(std::int32_t type) : KLTE_CQI_Decoding() {
-  setCQIType(type);
-}
+KLTE_CQI_Decoding::KLTE_CQI_Decoding(std::int32_t type) : KLTE_CQI_Decoding() { setCQIType(type); }
 
 KLTE_CQI_Decoding::KLTE_CQI_Decoding(std::int32_t type, std::uint32_t numBits)
     : KLTE_CQI_Decoding() {

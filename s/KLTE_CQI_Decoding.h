@@ -37,12 +37,10 @@ class KLTE_CQI_Decoding {
 
   // infoBits holds itsNumBits bits (any non-zero element counts as 1); codeBits must already
   // hold the encoded size. With no information bits nothing is checked or written.
-  bool encode(const std::vector<std::uint8_t>& infoBits,
-              std::vector<std::uint8_t>& codeBits) const;
+  bool encode(const std::vector<std::uint8_t>& infoBits, std::vector<std::uint8_t>& codeBits) const;
   // softBits holds the encoded size of soft values (positive favours 1); infoBits must
   // already hold itsNumBits elements and receives the most likely message.
-  bool decode(const std::vector<std::int32_t>& softBits,
-              std::vector<std::uint8_t>& infoBits) const;
+  bool decode(const std::vector<std::int32_t>& softBits, std::vector<std::uint8_t>& infoBits) const;
 
  private:
   bool acceptOperation(std::size_t infoSize, std::size_t codeSize, bool decoding) const;

@@ -150,16 +150,13 @@ std::uint32_t KLTE_DecoderViterbi::stateVectorToNumber(const std::vector<std::ui
   return number;
 }
 
-bool KLTE_DecoderViterbi::decode(const std::vector<std::int32_t>& q0,
-                                 const std::vector<std::int32_t>& q1,
-                                 const std::vector<std::int32_t>& q2,
-                                 const std::vector<std::int32_t>& e0,
-                                 const std::vector<std::int32_t>& e1,
-                                 const std::vector<std::int32_t>& e2,
-                                 std::vector<std::uint8_t>& decodedBits,
-                                 std::ostream& rawInputTrace, std::ostream& acsTrace,
-                                 std::ostream& bestStateTrace, std::ostream& tracebackTrace,
-                                 bool traceEnable, ExtendedRxData& extendedRxData) {
+bool KLTE_DecoderViterbi::decode(
+    const std::vector<std::int32_t>& q0, const std::vector<std::int32_t>& q1,
+    const std::vector<std::int32_t>& q2, const std::vector<std::int32_t>& e0,
+    const std::vector<std::int32_t>& e1, const std::vector<std::int32_t>& e2,
+    std::vector<std::uint8_t>& decodedBits, std::ostream& rawInputTrace, std::ostream& acsTrace,
+    std::ostream& bestStateTrace, std::ostream& tracebackTrace, bool traceEnable,
+    ExtendedRxData& extendedRxData) {
   const std::uint32_t T = itsTracebackLength;
   if (T < itsConstraintLength - 1) {
     errorLineFile(kSource, __LINE__, "Error: Traceback size must >= ", itsConstraintLength - 1);
@@ -323,8 +320,8 @@ bool KLTE_DecoderViterbi::decode(const std::vector<std::int32_t>& q0,
 
       if (acsOn) {
         acsTrace << "[Channel Type : CQI TB ACS output data: (Offset-Binary) Soft Bits " << s + 3
-                 << " : Format acs]\n[Size of Array 0 : " << kNumStates << "]\n[length: "
-                 << kNumStates << "]\n";
+                 << " : Format acs]\n[Size of Array 0 : " << kNumStates
+                 << "]\n[length: " << kNumStates << "]\n";
         for (std::uint32_t h = 0; h < kNumStates; ++h) {
           acsTrace << metric[bitrev6(h)] << '\n';
         }

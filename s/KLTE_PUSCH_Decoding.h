@@ -16,6 +16,7 @@
 #include <cstdint>
 #include <fstream>
 #include <memory>
+#include <span>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -40,15 +41,15 @@ class KLTE_PUSCH_Decoding {
 
   // Everything one shared-channel decode produces.
   struct SCHResults {
-    Streams harqOut;          // the combined soft values of all blocks, stream by stream
-    Bits tbOut;               // the transport block without its CRC
-    Bits cqiOut;              // the CQI report
-    Bits riOut;               // the RI bits
-    Bits ackOut;              // the HARQ-ACK bits
+    Streams harqOut;  // the combined soft values of all blocks, stream by stream
+    Bits tbOut;       // the transport block without its CRC
+    Bits cqiOut;      // the CQI report
+    Bits riOut;       // the RI bits
+    Bits ackOut;      // the HARQ-ACK bits
     std::uint8_t tbCrcPass = 0;
-    Bits crc_CWs;             // per code block: 1 when its CRC matched (0 for a lone block)
-    std::uint8_t ackFlag = 0; // 2-bit ACK parity failed
-    std::uint8_t riFlag = 0;  // 2-bit RI parity failed
+    Bits crc_CWs;                 // per code block: 1 when its CRC matched (0 for a lone block)
+    std::uint8_t ackFlag = 0;     // 2-bit ACK parity failed
+    std::uint8_t riFlag = 0;      // 2-bit RI parity failed
     std::uint8_t cqiCrcPass = 0;  // 0 no CQI, 1 block code, else the CRC8 outcome
   };
 
@@ -84,6 +85,16 @@ class KLTE_PUSCH_Decoding {
   // The HARQ buffer length of one stream: the sum of K_r + 4 over the code blocks.
   std::uint32_t getHarqLength() const;
 
+  // The buffers of one shared-channel call: the interface caches the caller's soft values in
+  // them and the decode leaves its results there. They live with the object so that each
+  // call reuses the memory of the previous one.
+  struct CallBuffers {
+    SoftValues llr;
+    Streams harqIn = Streams(3);
+    SCHResults results;
+  };
+  CallBuffers& callBuffers() { return itsCallBuffers; }
+
   // The whole decode of one transmission: deinterleaving and demultiplexing, the data chain
   // (with HARQ combining when retransmission is set; harqIn is then three streams of
   // getHarqLength() values), CQI, ACK and RI, dumps and register images.
@@ -99,16 +110,17 @@ class KLTE_PUSCH_Decoding {
   // The data chain of TS 36.212 5.1 undone: slicing and saturation per code block,
   // rate dematching, HARQ combining (itsCombineHARQ), turbo decoding, code-block and
   // transport-block CRCs. combined receives the combined streams of every block.
-  bool decodeData(const SoftValues& data, const Streams& harqIn, Streams& harqOut,
+  bool decodeData(std::span<const std::int32_t> data, const Streams& harqIn, Streams& harqOut,
                   std::vector<Streams>& combined, Bits& tbOut, std::uint8_t& tbCrcPass,
                   Bits& crc_CWs);
-  bool decodeNewData(const SoftValues& data, Streams& harqOut, std::vector<Streams>& combined,
-                     Bits& tbOut, std::uint8_t& tbCrcPass, Bits& crc_CWs);
-  bool decodeRetransmission(const SoftValues& data, const Streams& harqIn, Streams& harqOut,
-                            std::vector<Streams>& combined, Bits& tbOut,
+  bool decodeNewData(std::span<const std::int32_t> data, Streams& harqOut,
+                     std::vector<Streams>& combined, Bits& tbOut, std::uint8_t& tbCrcPass,
+                     Bits& crc_CWs);
+  bool decodeRetransmission(std::span<const std::int32_t> data, const Streams& harqIn,
+                            Streams& harqOut, std::vector<Streams>& combined, Bits& tbOut,
                             std::uint8_t& tbCrcPass, Bits& crc_CWs);
   // The HARQ input given per code block (C entries of three streams), joined and decoded.
-  bool decodeDataCWs(const SoftValues& data, const std::vector<Streams>& harqIn_CWs,
+  bool decodeDataCWs(std::span<const std::int32_t> data, const std::vector<Streams>& harqIn_CWs,
                      Streams& harqOut, std::vector<Streams>& combined, Bits& tbOut,
                      std::uint8_t& tbCrcPass, Bits& crc_CWs);
   // One code block's three streams through the turbo-decoder adapter.
@@ -169,18 +181,21 @@ class KLTE_PUSCH_Decoding {
   // Writes a record when the key's file is open (the record is built only then).
   void dump(std::uint32_t key, const Bits& bits, std::string_view comment);
   void dump(std::uint32_t key, const SoftValues& values, std::string_view comment);
+  void dump(std::uint32_t key, std::span<const std::int32_t> values, std::string_view comment);
   void dump(std::uint32_t key, const RegisterImage& words, std::string_view comment);
   void dump(std::uint32_t key, const Streams& streams, std::string_view comment);
   bool dumpOpen(std::uint32_t key);
   // The per-block loops of decodeData: each runs over every block and ANDs the results.
-  bool rateDematchCodeBlocks(const std::vector<SoftValues>& blocks, std::vector<Streams>& dematched);
-  bool applyHARQCodeBlocks(const std::vector<Streams>& harqBlocks,
-                           const std::vector<Streams>& dematched, std::vector<Streams>& combined);
+  // Without HARQ combining the dematched streams are moved into combined.
+  bool rateDematchCodeBlocks(const std::vector<std::span<const std::int32_t>>& blocks,
+                             std::vector<Streams>& dematched);
+  bool applyHARQCodeBlocks(const std::vector<Streams>& harqBlocks, std::vector<Streams>& dematched,
+                           std::vector<Streams>& combined);
   bool turboDecodeCodeBlocks(const std::vector<Streams>& combined, std::vector<Bits>& decoded);
   bool removeCodeBlockCRCs(const std::vector<Bits>& decoded, std::vector<Bits>& stripped,
                            Bits& crc_CWs);
   bool decodeACKorRI(bool isRI, const SoftValues& softIn, Bits& bits, std::uint8_t& parityError);
-  void packUciStatus(std::uint32_t size, std::uint8_t flag, const Bits& bits, unsigned line,
+  void packUciStatus(std::uint32_t size, std::uint8_t flag, const Bits& bits,
                      RegisterImage& words) const;
 
   std::array<std::ofstream, 37> itsDumpFiles;  // keys 0..32; the last four have no key
@@ -210,6 +225,17 @@ class KLTE_PUSCH_Decoding {
   std::uint32_t itsHarqSubframeId = 0;   // the subframe of the previous call
   bool itsCombineHARQ = false;           // the current call is a retransmission
   KTurboDecoderCModel itsTurboDecoder;
+  // Intermediate results of a decode, kept so that the next call reuses their memory.
+  struct Workspace {
+    SoftValues cqiData, cqi, ri, ack;
+    std::vector<std::span<const std::int32_t>> blocks;
+    std::vector<Streams> harqBlocks, dematched, combined;
+    std::vector<Bits> decoded, stripped;
+    Bits tbWithCrc;
+    std::vector<std::uint8_t> cellMarks;
+  };
+  Workspace itsWork;
+  CallBuffers itsCallBuffers;
 };
 
 }  // namespace brannoc

@@ -212,12 +212,16 @@ const KRateDeMatch::DematchMap* KRateDeMatch::dematchMap(std::uint32_t r) {
   return &itsMaps.back();
 }
 
-bool KRateDeMatch::rateDematchData(const SoftValues& in, Streams& out, std::uint32_t r) {
+bool KRateDeMatch::rateDematchData(std::span<const std::int32_t> in, Streams& out,
+                                   std::uint32_t r) {
   const DematchMap* map = itsParamsSet && in.size() == getCodeBlockE(r) ? dematchMap(r) : nullptr;
   if (map == nullptr) {
     return rateDematchDataReference(in, out, r);
   }
-  out.assign(3, SoftValues(map->D, 0));
+  out.resize(3);
+  for (SoftValues& stream : out) {
+    stream.assign(map->D, 0);
+  }
   std::int32_t* const streams[3] = {out[0].data(), out[1].data(), out[2].data()};
   const std::int64_t minQ = itsChaseFormat.getMinQ();
   const std::int64_t maxQ = itsChaseFormat.getMaxQ();
@@ -241,7 +245,8 @@ bool KRateDeMatch::rateDematchData(const SoftValues& in, Streams& out, std::uint
   return true;
 }
 
-bool KRateDeMatch::rateDematchDataReference(const SoftValues& in, Streams& out, std::uint32_t r) {
+bool KRateDeMatch::rateDematchDataReference(std::span<const std::int32_t> in, Streams& out,
+                                            std::uint32_t r) {
   out.assign(3, SoftValues());
   if (!itsParamsSet) {
     errorLineBare("Need to set RM parameters before calling RM data");
@@ -346,8 +351,9 @@ bool KRateDeMatch::createConvInterleavingTables(std::uint32_t mode, SoftValues& 
   return true;
 }
 
-bool KRateDeMatch::llrCollect(const SoftValues& in, const SoftValues& nullMap, SoftValues& w,
-                              std::uint32_t k0, std::uint32_t Ncb, std::uint32_t E) const {
+bool KRateDeMatch::llrCollect(std::span<const std::int32_t> in, const SoftValues& nullMap,
+                              SoftValues& w, std::uint32_t k0, std::uint32_t Ncb,
+                              std::uint32_t E) const {
   w.assign(Ncb, 0);
   if (E == 0) {
     return true;
@@ -427,7 +433,10 @@ bool KRateDeMatch::deinterleaveData(const SoftValues& w, const SoftValues& nullM
 bool KRateDeMatch::applyHARQ(const Streams& harqIn, const Streams& dematched, Streams& out,
                              std::uint32_t r) {
   const std::uint32_t D = getCodeBlockBufferLength(r) / 3;
-  out.assign(3, SoftValues(D, 0));
+  out.resize(3);
+  for (SoftValues& stream : out) {
+    stream.assign(D, 0);
+  }
   // Both inputs must hold D_r soft values in each of the three streams.
   for (std::size_t s = 0; s < 3; ++s) {
     const std::size_t harqSize = s < harqIn.size() ? harqIn[s].size() : 0;

@@ -20,6 +20,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -60,8 +61,8 @@ class KRateDeMatch {
   // straight to their stream positions through a map of the block's circular buffer, kept
   // for the next blocks and calls of the same geometry; rateDematchDataReference is the
   // step-by-step form (tables, llrCollect, deinterleaveData) it must equal.
-  bool rateDematchData(const SoftValues& in, Streams& out, std::uint32_t r);
-  bool rateDematchDataReference(const SoftValues& in, Streams& out, std::uint32_t r);
+  bool rateDematchData(std::span<const std::int32_t> in, Streams& out, std::uint32_t r);
+  bool rateDematchDataReference(std::span<const std::int32_t> in, Streams& out, std::uint32_t r);
   // Chase combining: out[s][i] = sat(dematched[s][i] + harqIn[s][i]) for the D_r values of
   // each stream.
   bool applyHARQ(const Streams& harqIn, const Streams& dematched, Streams& out, std::uint32_t r);
@@ -85,8 +86,8 @@ class KRateDeMatch {
   bool createConvInterleavingTables(std::uint32_t mode, SoftValues& nullMap, SoftValues& P) const;
   // Inverse bit selection: w = Ncb positions, in[m] added (saturating) at the m-th real
   // position met from k0 on, wrapping around the buffer.
-  bool llrCollect(const SoftValues& in, const SoftValues& nullMap, SoftValues& w, std::uint32_t k0,
-                  std::uint32_t Ncb, std::uint32_t E) const;
+  bool llrCollect(std::span<const std::int32_t> in, const SoftValues& nullMap, SoftValues& w,
+                  std::uint32_t k0, std::uint32_t Ncb, std::uint32_t E) const;
   bool deinterleaveData(const SoftValues& w, const SoftValues& nullMap, const SoftValues& P,
                         const SoftValues& pi, SoftValues& d0, SoftValues& d1, SoftValues& d2,
                         std::uint32_t r) const;

@@ -33,9 +33,9 @@ class KTurboDecoderCModel {
   bool createModel(const vexlon_ip_corvane_generics& generics);
 
   // Each sets one generics word and creates the model again.
-  bool setNumPU(std::uint32_t numPU);               // word 4
-  bool setAlgorithmType(std::uint32_t type);        // word 7
-  bool setExtrinsicBits(std::uint32_t bits);        // word 8
+  bool setNumPU(std::uint32_t numPU);         // word 4
+  bool setAlgorithmType(std::uint32_t type);  // word 7
+  bool setExtrinsicBits(std::uint32_t bits);  // word 8
 
   vexlon_ip_corvane_generics getGenerics() const { return itsGenerics; }
 

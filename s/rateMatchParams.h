@@ -14,29 +14,29 @@
 namespace brannoc {
 
 struct rateMatchParams {
-  bool complete = false;     // the derived fields have been computed at least once
-  std::uint32_t G = 0;       // rate-matched data bits (LLRs) of the transport block
-  std::uint32_t k0_0 = 0;    // k0 of K- code blocks
-  std::uint32_t k0_1 = 0;    // k0 of K+ code blocks
+  bool complete = false;   // the derived fields have been computed at least once
+  std::uint32_t G = 0;     // rate-matched data bits (LLRs) of the transport block
+  std::uint32_t k0_0 = 0;  // k0 of K- code blocks
+  std::uint32_t k0_1 = 0;  // k0 of K+ code blocks
   std::uint32_t NcbMinus = 0;
   std::uint32_t NcbPlus = 0;
-  std::uint32_t rowMinus = 0;  // sub-block interleaver rows of K- code blocks
-  std::uint32_t rowPlus = 0;   // rows of K+ code blocks
-  std::uint32_t E0 = 0;        // E of code blocks 0 .. Eidx
-  std::uint32_t E1 = 0;        // E of the code blocks after Eidx
-  std::uint32_t Eidx = 0;      // last code block of length E0
-  std::uint32_t riSize = 0;    // RI bits, 0..2
-  std::uint32_t ackSize = 0;   // ACK bits, 0..2
-  std::uint32_t cqiSize = 0;   // CQI bits, 0..127
-  std::uint32_t cqiQ = 0;      // coded CQI bits (LLRs)
-  std::uint32_t riQ = 0;       // coded RI bits
-  std::uint32_t ackQ = 0;      // coded ACK bits
-  std::uint32_t Qm = 0;        // modulation order: 2, 4 or 6
-  std::uint32_t Nlayers = 0;   // layers (1 on this core)
-  std::uint32_t NIR = 0;       // soft-buffer limit, 0 for none (the uplink has none)
-  std::uint32_t rvidx = 0;     // redundancy version, 0..3
-  std::uint32_t totalBits = 0; // coded bits (LLRs) of the whole transmission
-  std::uint32_t cpType = 0;    // cyclic prefix: 0 normal, 1 extended
+  std::uint32_t rowMinus = 0;   // sub-block interleaver rows of K- code blocks
+  std::uint32_t rowPlus = 0;    // rows of K+ code blocks
+  std::uint32_t E0 = 0;         // E of code blocks 0 .. Eidx
+  std::uint32_t E1 = 0;         // E of the code blocks after Eidx
+  std::uint32_t Eidx = 0;       // last code block of length E0
+  std::uint32_t riSize = 0;     // RI bits, 0..2
+  std::uint32_t ackSize = 0;    // ACK bits, 0..2
+  std::uint32_t cqiSize = 0;    // CQI bits, 0..127
+  std::uint32_t cqiQ = 0;       // coded CQI bits (LLRs)
+  std::uint32_t riQ = 0;        // coded RI bits
+  std::uint32_t ackQ = 0;       // coded ACK bits
+  std::uint32_t Qm = 0;         // modulation order: 2, 4 or 6
+  std::uint32_t Nlayers = 0;    // layers (1 on this core)
+  std::uint32_t NIR = 0;        // soft-buffer limit, 0 for none (the uplink has none)
+  std::uint32_t rvidx = 0;      // redundancy version, 0..3
+  std::uint32_t totalBits = 0;  // coded bits (LLRs) of the whole transmission
+  std::uint32_t cpType = 0;     // cyclic prefix: 0 normal, 1 extended
   segmentationParams seg;
 
   // Stores the transmission's totals (recomputing the segmentation from its current B);
