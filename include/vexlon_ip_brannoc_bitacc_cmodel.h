@@ -156,9 +156,45 @@ VEXLON_IP_BRANNOC_API vexlon_ip_brannoc_state *vexlon_ip_brannoc_create_state(
 /* Destroys an instance and closes its dump files; a null pointer does nothing. */
 VEXLON_IP_BRANNOC_API void vexlon_ip_brannoc_destroy_state(vexlon_ip_brannoc_state *state);
 
-/* Decodes one PUSCH transmission. Returns 0 on success, else a status code that names the
-   failure (101..167 argument checks, 200/201 decode failures, 300..305 output capacity,
-   999 an internal exception). */
+/* Decodes one PUSCH transmission: deinterleaving and demultiplexing (TS 36.212 5.2.2.8,
+   5.2.2.7), rate dematching with HARQ combining when SCH_ND is 0, turbo decoding, code-block
+   and transport-block CRCs, CQI (block code up to 11 bits, else CRC8 and the convolutional
+   code), ACK and RI with their parity checks. Returns 0 on success, else the first failure:
+     101, 102 null state / outputs;
+     103..118, 120..125, 127..135, 167 a control field out of range or inconsistent;
+     136..141 a null output array (data, ACK, RI, the three HARQ buffers);
+     168 SCH_CQI_out null with SCH_CQI_OP_SIZE > 0; 169 CW_CRC_out null with data soft values
+         (G > 0), both checked here because the call would write them;
+     142..146 an output capacity below its control field, or below harq_buffer_size;
+     147..150 tb_llr null, or an input HARQ buffer null with SCH_ND 0;
+     151, 152 llr_size is not Qm * SCH_CH_INT_ROWS * columns;
+     166 llr_size / Qm exceeds C_INTERLEAVER_BUFFER_SIZE;
+     153, 154 max_harq_buffer_size or (retransmission) harq_buffer_size does not match the
+         code-block segmentation (sum of K + 4);
+     155..157 the turbo decoder's units, algorithm or iterations refused (SCH_TD_ITER 0
+         without data reaches 157);
+     158 llr_size is not G + SCH_CQI_IP_SIZE + SCH_RI_IP_SIZE;
+     159..163 the decoder refused a parameter set (the field checks above refuse every such
+         value first);
+     164, 165 the LLRs or HARQ buffers could not be cached (out of memory);
+     200, 201 the decode failed (new data, retransmission), after the decoder's own lines;
+         among them: ACK or RI soft values that are not whole modulation symbols or exceed
+         four columns, and data soft values that no code block can carry (G below Qm times
+         the code blocks), reported as the data-length mismatch they are;
+     300..305 a result larger than its array (HARQ, data, CQI, ACK, RI, code-block flags);
+         results copied before the failing one stay written;
+     999 an internal exception.
+   Checks 101..169 change nothing; the configuration steps from 155 on leave the decoder
+   configured for this call. Outputs are written only on success (and as said for 300..305),
+   never beyond their capacities. A first transmission (SCH_ND 1) never reads the input HARQ
+   buffers, whatever harq_buffer_size says. Soft values may hold any 32-bit value: each is
+   saturated to -128..127 (the first saturation of the process prints one warning line).
+   Flags on success: SCH_TB_crc_error is 1 when the transport-block CRC failed, and 0 when
+   the call carried no data (no transport block, nothing failed); CW_CRC_out holds one byte
+   per code block, 1 when its 24-bit CRC failed, and for a transport block of a single code
+   block (which has no CRC of its own) always 1: its outcome is SCH_TB_crc_error.
+   SCH_CQI_crc_error is 1 when the CQI CRC failed and when no CQI was decoded. The HARQ
+   buffers written are what the caller passes back, unchanged, with a retransmission. */
 VEXLON_IP_BRANNOC_API int32_t vexlon_ip_brannoc_SCH_bitacc_simulate(
     vexlon_ip_brannoc_state *state, vexlon_ip_brannoc_SCH_inputs inputs,
     vexlon_ip_brannoc_SCH_outputs *outputs);
