@@ -1,5 +1,6 @@
-// Sub-block interleaver (TS 36.212 5.1.4.1.1 and 5.1.4.2.1): the column patterns of
-// Tables 5.1.4-1 and 5.1.4-2, dummy bits, and the read order of the three turbo streams.
+// Sub-block interleaver (TS 36.212 5.1.4.1.1 and 5.1.4.2.1): worked positions of the column
+// patterns of Tables 5.1.4-1 and 5.1.4-2, dummy bits, the read order of the three turbo
+// streams, and a permutation for every shape.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -10,16 +11,6 @@
 
 namespace brannoc::tx {
 namespace {
-
-TEST(SubBlockInterleaver, ColumnPatternsAreTheStandardTables) {
-  const std::array<std::uint8_t, 32> turbo{0, 16, 8,  24, 4, 20, 12, 28, 2, 18, 10,
-                                           26, 6, 22, 14, 30, 1, 17, 9,  25, 5, 21,
-                                           13, 29, 3, 19, 11, 27, 7, 23, 15, 31};
-  EXPECT_EQ(subBlockColumnPattern(SubBlockPattern::Turbo), turbo);
-  // Table 5.1.4-2 is Table 5.1.4-1 with its two halves swapped.
-  const auto& c = subBlockColumnPattern(SubBlockPattern::Convolutional);
-  for (std::uint32_t j = 0; j < 32; ++j) EXPECT_EQ(c[j], turbo[(j + 16) % 32]) << j;
-}
 
 TEST(SubBlockInterleaver, OutputsReadTheWorkedInputPositions) {
   // D = 44 (K = 40): R = 2, Kpi = 64, ND = 20, v_k = y[P(k/2) + 32(k%2)]; the third turbo
