@@ -1,5 +1,6 @@
 // Helpers shared by the decoder library's tests: captured error lines matched against a
-// pattern, an instance owned for the length of a test, a scratch folder for dump files.
+// pattern, tables of refused calls, random bits, an instance owned for the length of a test,
+// a scratch folder for dump files.
 #ifndef BRANNOC_TESTS_DECODERTESTSUPPORT_H
 #define BRANNOC_TESTS_DECODERTESTSUPPORT_H
 
@@ -8,10 +9,13 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <functional>
 #include <iterator>
+#include <random>
 #include <regex>
 #include <sstream>
 #include <string>
+#include <vector>
 
 #include "vexlon_ip_brannoc_bitacc_cmodel.h"
 
@@ -33,6 +37,30 @@ std::string stderrOf(Call&& call) {
   testing::internal::CaptureStderr();
   call();
   return testing::internal::GetCapturedStderr();
+}
+
+// A call that must be refused (return false) and print exactly lines, a pattern of
+// expectLines.
+struct Refusal {
+  std::function<bool()> call;
+  std::string lines;
+};
+
+inline void expectRefusals(const std::vector<Refusal>& refusals) {
+  for (std::size_t i = 0; i < refusals.size(); ++i) {
+    SCOPED_TRACE("refusal " + std::to_string(i) + ": " + refusals[i].lines);
+    bool accepted = true;
+    expectLines(stderrOf([&] { accepted = refusals[i].call(); }), refusals[i].lines);
+    EXPECT_FALSE(accepted);
+  }
+}
+
+inline std::vector<std::uint8_t> randomBits(std::size_t n, std::mt19937& random) {
+  std::vector<std::uint8_t> bits(n);
+  for (std::uint8_t& bit : bits) {
+    bit = static_cast<std::uint8_t>(random() & 1U);
+  }
+  return bits;
 }
 
 // An instance of the decoder library, destroyed with the object.

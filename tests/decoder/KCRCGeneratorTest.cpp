@@ -1,14 +1,17 @@
-// KCRCGenerator: known answers of the four LTE generators, parity order, masks, checking.
-#include "KCRCGenerator.h"
-
+// KCRCGenerator: known answers of the four LTE generators, the transmitter's parities, masks,
+// checking.
 #include <gtest/gtest.h>
 
+#include <random>
 #include <string>
 #include <vector>
 
-namespace {
+#include "DecoderTestSupport.h"
+#include "KCRCGenerator.h"
+#include "tx/Crc.h"
 
-using brannoc::KCRCGenerator;
+namespace brannoc::test {
+namespace {
 
 using Bits = std::vector<std::uint8_t>;
 
@@ -27,30 +30,43 @@ std::uint32_t parityWord(const Bits& coded, std::size_t n, std::uint32_t L) {
   return word;
 }
 
-// x^L mod g(x) is g's low part: the parity of the single bit 1 spells the polynomial, highest
-// power first. The check values are the CRC catalogue's (zero init, no reflection).
-TEST(KCRCGenerator, SingleBitSpellsThePolynomialAndDigitsGiveTheCatalogueCheckValue) {
+// The check values of the digits are the CRC catalogue's (zero init, no reflection). Random
+// messages get the transmitter's parity, which was written independently, pass the check and
+// fail it after any single flip.
+TEST(KCRCGenerator, KnownAnswersTheTransmittersParityAndEverySingleFlipDetected) {
   struct Case {
     void (KCRCGenerator::*select)();
-    std::uint32_t L, lowCoefficients, checkOf123456789;
+    tx::CrcType type;
+    std::uint32_t L, checkOf123456789;
   };
-  const Case cases[] = {{&KCRCGenerator::setCRC24A, 24, 0x864CFB, 0xCDE703},
-                        {&KCRCGenerator::setCRC24B, 24, 0x800063, 0x23EF52},
-                        {&KCRCGenerator::setCRC16, 16, 0x1021, 0x31C3},
-                        {&KCRCGenerator::setCRC8, 8, 0x9B, 0xEA}};
+  const Case cases[] = {{&KCRCGenerator::setCRC24A, tx::CrcType::Crc24A, 24, 0xCDE703},
+                        {&KCRCGenerator::setCRC24B, tx::CrcType::Crc24B, 24, 0x23EF52},
+                        {&KCRCGenerator::setCRC16, tx::CrcType::Crc16, 16, 0x31C3},
+                        {&KCRCGenerator::setCRC8, tx::CrcType::Crc8, 8, 0xEA}};
   const Bits digits = bitsOfText("123456789");
+  std::mt19937 random(8);
   for (const Case& c : cases) {
     KCRCGenerator crc;
     (crc.*c.select)();
-    Bits coded;
-    ASSERT_TRUE(crc.generate({1}, coded, 0));
-    ASSERT_EQ(coded.size(), 1 + c.L);
-    EXPECT_EQ(coded[0], 1);
-    EXPECT_EQ(parityWord(coded, 1, c.L), c.lowCoefficients) << "L " << c.L;
+    Bits coded, out;
     ASSERT_TRUE(crc.generate(digits, coded, 0));
     EXPECT_EQ(parityWord(coded, digits.size(), c.L), c.checkOf123456789) << "L " << c.L;
     ASSERT_TRUE(crc.generate({}, coded, 0));  // empty input: L zero parity bits
     EXPECT_EQ(coded, Bits(c.L, 0));
+    for (std::size_t length : {1u, 40u, 333u}) {
+      const Bits message = randomBits(length, random);
+      std::uint8_t pass = 0;
+      ASSERT_TRUE(crc.generate(message, coded, 0));
+      EXPECT_EQ(coded, tx::attachCrc(message, c.type)) << "L " << c.L << " length " << length;
+      ASSERT_TRUE(crc.check(coded, out, pass, 0));
+      EXPECT_TRUE(pass == 1 && out == message) << "L " << c.L << " length " << length;
+      for (std::size_t i = 0; i < coded.size(); ++i) {
+        coded[i] ^= 1;
+        ASSERT_TRUE(crc.check(coded, out, pass, 0));
+        EXPECT_EQ(pass, 0) << "L " << c.L << " length " << length << " flip at " << i;
+        coded[i] ^= 1;
+      }
+    }
   }
 }
 
@@ -74,33 +90,9 @@ TEST(KCRCGenerator, MaskBitITogglesParityBitI) {
   EXPECT_EQ(pass, 0);
 }
 
-TEST(KCRCGenerator, CheckPassesOnGeneratedWordAndFailsOnEverySingleFlip) {
-  KCRCGenerator crc;
-  crc.setCRC24B();
-  const Bits data = bitsOfText("code block");
-  Bits coded;
-  crc.generate(data, coded, 0);
-  Bits out;
-  std::uint8_t pass = 0;
-  ASSERT_TRUE(crc.check(coded, out, pass, 0));
-  EXPECT_EQ(pass, 1);
-  EXPECT_EQ(out, data);
-  for (std::size_t i = 0; i < coded.size(); ++i) {
-    Bits flipped = coded;
-    flipped[i] ^= 1;
-    ASSERT_TRUE(crc.check(flipped, out, pass, 0));
-    EXPECT_EQ(pass, 0) << "flip at " << i;
-  }
-  // An element other than 0 or 1 fails the check even when its low bit fits, and is kept.
-  crc.setCRC8();
-  crc.generate({1, 0, 1}, coded, 0);
-  coded[1] = 2;
-  ASSERT_TRUE(crc.check(coded, out, pass, 0));
-  EXPECT_EQ(pass, 0);
-  EXPECT_EQ(out, (Bits{1, 2, 1}));
-}
-
-TEST(KCRCGenerator, RefusesWithoutAGeneratorOrWithoutMoreThanLElements) {
+// Refused without a generator or without more than L elements; an element other than 0 or 1
+// fails the check even when its low bit fits, and is kept.
+TEST(KCRCGenerator, RefusesWithoutAGeneratorOrMoreThanLElementsAndFailsNonBits) {
   KCRCGenerator crc;
   Bits coded, out;
   std::uint8_t pass = 7;
@@ -112,6 +104,12 @@ TEST(KCRCGenerator, RefusesWithoutAGeneratorOrWithoutMoreThanLElements) {
   EXPECT_TRUE(crc.check(Bits(9, 0), out, pass, 0));
   EXPECT_EQ(out.size(), 1u);
   EXPECT_EQ(pass, 1);
+  crc.generate({1, 0, 1}, coded, 0);
+  coded[1] = 2;
+  ASSERT_TRUE(crc.check(coded, out, pass, 0));
+  EXPECT_EQ(pass, 0);
+  EXPECT_EQ(out, (Bits{1, 2, 1}));
 }
 
 }  // namespace
+}  // namespace brannoc::test

@@ -1,6 +1,4 @@
 // Tests of the debug-dump descriptor, value formatters, record writers and dump-file opener.
-#include "KFileIO.h"
-
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -12,34 +10,22 @@
 #include <string>
 #include <vector>
 
+#include "DecoderTestSupport.h"
+#include "KFileIO.h"
+
 namespace brannoc {
 namespace {
 
+using test::fileText;
+using test::stderrOf;
+
 std::string repeat(char c, std::size_t n) { return std::string(n, c); }
 
-std::string readFile(const std::filesystem::path& path) {
-  std::ifstream in(path);
-  return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-}
-
-template <typename F>
-std::string stderrOf(F&& f) {
-  testing::internal::CaptureStderr();
-  f();
-  return testing::internal::GetCapturedStderr();
-}
-
-// A descriptor writing into an in-memory stream.
-struct MemoryDump {
-  std::ostringstream stream;
-  DumpDescriptor descriptor;
-  MemoryDump(std::uint32_t mode, std::uint32_t decWidth, std::uint32_t binWidth,
-             std::uint32_t hexWidth, std::uint32_t address = 0, std::uint32_t step = 4)
-      : descriptor(&stream, mode, address, step, decWidth, binWidth, hexWidth) {}
-};
-
 TEST(DumpDescriptor, WidthSettersRefuseOutsideTheirRangeAndKeepTheOldWidth) {
-  const std::string kept = " is unchanged. Width must be in ";
+  const auto refusal = [](std::uint32_t width, std::uint32_t old, const char* range) {
+    return "Invalid Witdh: " + std::to_string(width) + ". Value " + std::to_string(old) +
+           " is unchanged. Width must be in " + range + "\n";
+  };
   struct Case {
     bool (DumpDescriptor::*set)(std::uint32_t);
     std::uint32_t (DumpDescriptor::*get)() const;
@@ -47,14 +33,11 @@ TEST(DumpDescriptor, WidthSettersRefuseOutsideTheirRangeAndKeepTheOldWidth) {
     std::string line;  // empty when accepted
   };
   const Case cases[] = {
-      {&DumpDescriptor::setDecWidth, &DumpDescriptor::getDecWidth, 33,
-       "Invalid Witdh: 33. Value 20" + kept + "[1,32]\n"},
+      {&DumpDescriptor::setDecWidth, &DumpDescriptor::getDecWidth, 33, refusal(33, 20, "[1,32]")},
       {&DumpDescriptor::setDecWidth, &DumpDescriptor::getDecWidth, 32, ""},
-      {&DumpDescriptor::setBinWidth, &DumpDescriptor::getBinWidth, 40,
-       "Invalid Witdh: 40. Value 16" + kept + "[1,39]\n"},
+      {&DumpDescriptor::setBinWidth, &DumpDescriptor::getBinWidth, 40, refusal(40, 16, "[1,39]")},
       {&DumpDescriptor::setBinWidth, &DumpDescriptor::getBinWidth, 39, ""},
-      {&DumpDescriptor::setHexWidth, &DumpDescriptor::getHexWidth, 15,
-       "Invalid Witdh: 15. Value 8" + kept + "[1,15)\n"},
+      {&DumpDescriptor::setHexWidth, &DumpDescriptor::getHexWidth, 15, refusal(15, 8, "[1,15)")},
       {&DumpDescriptor::setHexWidth, &DumpDescriptor::getHexWidth, 1, ""},
   };
   for (const Case& c : cases) {
@@ -67,9 +50,7 @@ TEST(DumpDescriptor, WidthSettersRefuseOutsideTheirRangeAndKeepTheOldWidth) {
   }
   // Refused in the constructor, the widths keep their first values 32, 32 and 12.
   EXPECT_EQ(stderrOf([] { DumpDescriptor(nullptr, 0, 0, 4, 0, 40, 15); }),
-            "Invalid Witdh: 0. Value 32" + kept + "[1,32]\n"
-            "Invalid Witdh: 40. Value 32" + kept + "[1,39]\n"
-            "Invalid Witdh: 15. Value 12" + kept + "[1,15)\n");
+            refusal(0, 32, "[1,32]") + refusal(40, 32, "[1,39]") + refusal(15, 12, "[1,15)"));
 }
 
 // Binary text is the low width bits of the two's complement; hexadecimal text is padded,
@@ -116,56 +97,13 @@ TEST(KFileIOFormat, OversizedWidthsAreCutAndUnsupportedTypesGiveCrosses) {
   }
 }
 
-TEST(KFileIOWriteVector, SoftValuesInEveryFormat) {
-  // Values 5 and -5; widths dec 4, bin 8, hex 4; address 0x10 step 8.
-  const std::pair<std::uint32_t, std::string> cases[] = {
-      {kDumpDecimal, "   5\n  -5\n"},
-      {kDumpBinary, "00000101  #  5\n11111011  #  -5\n"},
-      {kDumpHex, "0x0005  #  5\n0xfffffffb  #  -5\n"},
-      {kDumpAddressDecimal, "W 0x00000010  5\nW 0x00000018  -5\n"},
-      {kDumpAddressBinary, "W 0x00000010  00000101  #  5\nW 0x00000018  11111011  #  -5\n"},
-      {kDumpAddressHex, "W 0x00000010  0x0005  #  5\nW 0x00000018  0xfffffffb  #  -5\n"},
-      {7, ""},
-  };
-  for (const auto& [mode, lines] : cases) {
-    MemoryDump dump(mode, 4, 8, 4, 0x10, 8);
-    ASSERT_TRUE(writeVector(dump.descriptor, std::vector<std::int32_t>{5, -5}, ""));
-    EXPECT_EQ(dump.stream.str(), "[ length: 2]\n" + lines) << "mode " << mode;
-  }
-}
-
-// Bit vectors print one bit, or two in mode 1; each comment line is framed in brackets.
-TEST(KFileIOWriteVector, BitVectorsAndCommentLines) {
-  const std::string zeros = repeat('0', 15);
-  const std::pair<std::uint32_t, std::string> cases[] = {
-      {kDumpDecimalTwoBits, "  0\n  1\n  3\n"},
-      {kDumpBinary, zeros + "0  #  0\n" + zeros + "1  #  1\n" + zeros + "1  #  1\n"},
-  };
-  for (const auto& [mode, lines] : cases) {
-    MemoryDump dump(mode, 3, 16, 8);
-    ASSERT_TRUE(writeVector(dump.descriptor, std::vector<std::uint8_t>{0, 1, 3}, "OUT\n\nX\n"));
-    EXPECT_EQ(dump.stream.str(), "[OUT]\n[]\n[X]\n[ length: 3]\n" + lines) << "mode " << mode;
-  }
-}
-
-TEST(KFileIOWriteVector, RegisterWordsRestartTheirAddressEveryRecord) {
-  MemoryDump dump(kDumpAddressBinary, 20, 32, 8, 0x2200, 4);
-  const std::vector<std::uint64_t> words{5, 6};
-  ASSERT_TRUE(writeVector(dump.descriptor, words, "CTRL"));
-  ASSERT_TRUE(writeVector(dump.descriptor, words, "CTRL"));
-  const std::string record = "[CTRL]\n[ length: 2]\n"
-                             "W 0x00002200  " + repeat('0', 29) + "101  #  5\n"
-                             "W 0x00002204  " + repeat('0', 29) + "110  #  6\n";
-  EXPECT_EQ(dump.stream.str(), record + record);
-}
-
 TEST(KFileIOWriteVector, NothingIsWrittenWithoutAnOpenGoodStream) {
   std::ofstream unopened;
   std::ostringstream broken;
   broken.setstate(std::ios::badbit);
-  for (std::ostream* file : {static_cast<std::ostream*>(nullptr),
-                             static_cast<std::ostream*>(&unopened),
-                             static_cast<std::ostream*>(&broken)}) {
+  for (std::ostream* file :
+       {static_cast<std::ostream*>(nullptr), static_cast<std::ostream*>(&unopened),
+        static_cast<std::ostream*>(&broken)}) {
     DumpDescriptor descriptor;
     descriptor.setFile(file);
     descriptor.setMode(kDumpBinary);
@@ -179,52 +117,86 @@ TEST(KFileIOWriteVector, NothingIsWrittenWithoutAnOpenGoodStream) {
   EXPECT_EQ(broken.str(), "");
 }
 
-TEST(KFileIOWriteArrays, ShortArrayShowsZeroBitsAndAnX) {
-  MemoryDump dump(kDumpBinary, 20, 16, 8);
-  ASSERT_TRUE(writeArrays(dump.descriptor, {1, 2, 3}, {-1, 0, 4}, {7, 8}, "d0 d1 d2"));
-  const std::string zero = repeat('0', 16);
-  EXPECT_EQ(dump.stream.str(),
-            "[d0 d1 d2]\n"
-            "[  Size of Array 1: 3 Size of Array 2: 3  Size of Array 3: 2]\n"
-            "[ length: 3]\n" +
-                repeat('0', 15) + "1" + repeat('1', 16) + repeat('0', 13) + "111  #  1  -1  7  \n" +
-                repeat('0', 14) + "10" + zero + repeat('0', 12) + "1000  #  2  0  8  \n" +
-                repeat('0', 14) + "11" + repeat('0', 13) + "100" + zero + "  #  3  4  X  \n");
-}
-
-TEST(KFileIOWriteArrays, ThreeArraysInOtherFormatsAndSixArrays) {
-  // Arrays {1, -2}, {3}, {} with widths dec 3, bin 4, hex 2; address 0x40 step 4.
-  const std::pair<std::uint32_t, std::string> cases[] = {
-      {kDumpDecimal, "  1    3    X  \n -2    X    X  \n"},
-      {kDumpDecimalTwoBits, ""},
-      {kDumpHex, "0x010x030x00  #  1  3  X  \n0xfffffffe0x000x00  #  -2  X  X  \n"},
-      {kDumpAddressBinary,
-       "W 0x00000040  000100110000  #  1  3  X  \nW 0x00000044  111000000000  #  -2  X  X  \n"},
+// Each writer in the formats it offers. Vector records: soft values 5 and -5 (widths dec 4,
+// bin 8, hex 4; address 0x10 step 8; mode 7 prints no lines), bits in one or (mode 1) two
+// digits with comment lines framed in brackets, register words whose address restarts every
+// record. Array records: side by side, a short array shows zero bits and an X, mode 1 prints
+// no lines.
+TEST(KFileIOWrite, RecordsInEveryFormat) {
+  using Write = std::function<bool(DumpDescriptor&)>;
+  const Write soft = [](DumpDescriptor& d) {
+    return writeVector(d, std::vector<std::int32_t>{5, -5}, "");
   };
-  for (const auto& [mode, lines] : cases) {
-    MemoryDump dump(mode, 3, 4, 2, 0x40, 4);
-    ASSERT_TRUE(writeArrays(dump.descriptor, {1, -2}, {3}, {}, ""));
-    EXPECT_EQ(dump.stream.str(),
-              "[  Size of Array 1: 2 Size of Array 2: 1  Size of Array 3: 0]\n[ length: 2]\n" +
-                  lines)
-        << "mode " << mode;
+  const Write bits = [](DumpDescriptor& d) {
+    return writeVector(d, std::vector<std::uint8_t>{0, 1, 3}, "OUT\n\nX\n");
+  };
+  const Write words = [](DumpDescriptor& d) {
+    return writeVector(d, std::vector<std::uint64_t>{5, 6}, "CTRL") &&
+           writeVector(d, std::vector<std::uint64_t>{5, 6}, "CTRL");
+  };
+  const Write three = [](DumpDescriptor& d) { return writeArrays(d, {1, -2}, {3}, {}, ""); };
+  const std::string z15 = repeat('0', 15), z16 = repeat('0', 16), z29 = repeat('0', 29);
+  const std::string word = "[CTRL]\n[ length: 2]\nW 0x00002200  " + z29 +
+                           "101  #  5\nW 0x00002204  " + z29 + "110  #  6\n";
+  const std::string sizes = "[  Size of Array 1: 2 Size of Array 2: 1  Size of Array 3: 0]\n";
+  struct Case {
+    std::uint32_t mode, decWidth, binWidth, hexWidth, address, step;
+    Write write;
+    std::string text;
+  };
+  const Case cases[] = {
+      {kDumpDecimal, 4, 8, 4, 0x10, 8, soft, "[ length: 2]\n   5\n  -5\n"},
+      {kDumpBinary, 4, 8, 4, 0x10, 8, soft, "[ length: 2]\n00000101  #  5\n11111011  #  -5\n"},
+      {kDumpHex, 4, 8, 4, 0x10, 8, soft, "[ length: 2]\n0x0005  #  5\n0xfffffffb  #  -5\n"},
+      {kDumpAddressDecimal, 4, 8, 4, 0x10, 8, soft,
+       "[ length: 2]\nW 0x00000010  5\nW 0x00000018  -5\n"},
+      {kDumpAddressBinary, 4, 8, 4, 0x10, 8, soft,
+       "[ length: 2]\nW 0x00000010  00000101  #  5\nW 0x00000018  11111011  #  -5\n"},
+      {kDumpAddressHex, 4, 8, 4, 0x10, 8, soft,
+       "[ length: 2]\nW 0x00000010  0x0005  #  5\nW 0x00000018  0xfffffffb  #  -5\n"},
+      {7, 4, 8, 4, 0x10, 8, soft, "[ length: 2]\n"},
+      {kDumpDecimalTwoBits, 3, 16, 8, 0, 4, bits, "[OUT]\n[]\n[X]\n[ length: 3]\n  0\n  1\n  3\n"},
+      {kDumpBinary, 3, 16, 8, 0, 4, bits,
+       "[OUT]\n[]\n[X]\n[ length: 3]\n" + z15 + "0  #  0\n" + z15 + "1  #  1\n" + z15 +
+           "1  #  1\n"},
+      {kDumpAddressBinary, 20, 32, 8, 0x2200, 4, words, word + word},
+      {kDumpBinary, 20, 16, 8, 0, 4,
+       [](DumpDescriptor& d) {
+         return writeArrays(d, {1, 2, 3}, {-1, 0, 4}, {7, 8}, "d0 d1 d2");
+       },
+       "[d0 d1 d2]\n[  Size of Array 1: 3 Size of Array 2: 3  Size of Array 3: 2]\n[ length: 3]\n" +
+           z15 + "1" + repeat('1', 16) + repeat('0', 13) + "111  #  1  -1  7  \n" +
+           repeat('0', 14) + "10" + z16 + repeat('0', 12) + "1000  #  2  0  8  \n" +
+           repeat('0', 14) + "11" + repeat('0', 13) + "100" + z16 + "  #  3  4  X  \n"},
+      {kDumpDecimal, 3, 4, 2, 0x40, 4, three,
+       sizes + "[ length: 2]\n  1    3    X  \n -2    X    X  \n"},
+      {kDumpDecimalTwoBits, 3, 4, 2, 0x40, 4, three, sizes + "[ length: 2]\n"},
+      {kDumpHex, 3, 4, 2, 0x40, 4, three,
+       sizes + "[ length: 2]\n0x010x030x00  #  1  3  X  \n0xfffffffe0x000x00  #  -2  X  X  \n"},
+      {kDumpAddressBinary, 3, 4, 2, 0x40, 4, three,
+       sizes + "[ length: 2]\nW 0x00000040  000100110000  #  1  3  X  \n"
+               "W 0x00000044  111000000000  #  -2  X  X  \n"},
+      {kDumpBinary, 20, 2, 8, 0, 4,
+       [](DumpDescriptor& d) {
+         return writeArrays(d, {1}, {0, 3}, {}, {2}, {}, {1}, "TB");
+       },
+       "[TB]\n[  Size of Array 1: 1 Size of Array 2: 2  Size of Array 3: 0  Size of Array 4: 1"
+       "  Size of Array 5: 0  Size of Array 6: 1]\n[ length: 2]\n"
+       "010000100001  #  1  0  X  2  X  1  \n001100000000  #  X  3  X  X  X  X  \n"},
+  };
+  for (std::size_t i = 0; i < std::size(cases); ++i) {
+    const Case& c = cases[i];
+    std::ostringstream stream;
+    DumpDescriptor descriptor(&stream, c.mode, c.address, c.step, c.decWidth, c.binWidth,
+                              c.hexWidth);
+    ASSERT_TRUE(c.write(descriptor)) << "case " << i;
+    EXPECT_EQ(stream.str(), c.text) << "case " << i << ", mode " << c.mode;
   }
-  MemoryDump dump(kDumpBinary, 20, 2, 8);
-  ASSERT_TRUE(writeArrays(dump.descriptor, {1}, {0, 3}, {}, {2}, {}, {1}, "TB"));
-  EXPECT_EQ(dump.stream.str(),
-            "[TB]\n"
-            "[  Size of Array 1: 1 Size of Array 2: 2  Size of Array 3: 0  Size of Array 4: 1"
-            "  Size of Array 5: 0  Size of Array 6: 1]\n"
-            "[ length: 2]\n"
-            "010000100001  #  1  0  X  2  X  1  \n"
-            "001100000000  #  X  3  X  X  X  X  \n");
 }
 
 TEST(KFileIOOpen, NameIsPrefixPieceAndLogAndReopeningTruncatesOrAppends) {
-  const std::filesystem::path directory =
-      std::filesystem::path(testing::TempDir()) / "kfileio_open";
-  std::filesystem::remove_all(directory);
-  std::filesystem::create_directories(directory);
+  const test::ScratchDir scratch;
+  const std::filesystem::path& directory = scratch.path();
   const std::string prefix = (directory / "SCH_rx_").string();
   std::ofstream stream;
   DumpDescriptor descriptor(nullptr, kDumpAddressBinary, 0x2234, 4, 20, 32, 8);
@@ -245,15 +217,14 @@ TEST(KFileIOOpen, NameIsPrefixPieceAndLogAndReopeningTruncatesOrAppends) {
   ASSERT_TRUE(openOutputFile(stream, prefix, "STATUS", false));
   write("");
   stream.close();
-  EXPECT_EQ(readFile(directory / "SCH_rx_CTRL.log"), "[CTRL]\n" + line + "[CTRL]\n" + line);
-  EXPECT_EQ(readFile(directory / "SCH_rx_STATUS.log"), line);
+  EXPECT_EQ(fileText(directory / "SCH_rx_CTRL.log"), "[CTRL]\n" + line + "[CTRL]\n" + line);
+  EXPECT_EQ(fileText(directory / "SCH_rx_STATUS.log"), line);
 
   const std::string missing = (directory / "absent" / "CCH_rx_").string();
   EXPECT_EQ(stderrOf([&] { EXPECT_FALSE(openOutputFile(stream, missing, "Ctrl_Out", false)); }),
             "ERROR:Could not open output file '" + missing + "Ctrl_Out.log'\n");
   EXPECT_FALSE(writeVector(descriptor, std::vector<std::int32_t>{1}, "CTRL"));
   EXPECT_FALSE(std::filesystem::exists(directory / "absent"));
-  std::filesystem::remove_all(directory);
 }
 
 }  // namespace

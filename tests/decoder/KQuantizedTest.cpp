@@ -8,11 +8,11 @@
 #include <sstream>
 #include <string>
 
+#include "DecoderTestSupport.h"
 #include "KQuantized.h"
 
+namespace brannoc::test {
 namespace {
-
-using brannoc::KQuantized;
 
 const std::string kHigh = "Saturation (HIGH) ocurred.\n";
 const std::string kLow = "Saturation (LOW ) ocurred.\n";
@@ -21,13 +21,6 @@ const std::string kFormatWarning =
     "desired format.\n";
 
 KQuantized llr(bool verbose = false) { return KQuantized(0.0, 3, 5, verbose); }
-
-template <typename F>
-std::string stderrOf(F&& f) {
-  testing::internal::CaptureStderr();
-  f();
-  return testing::internal::GetCapturedStderr();
-}
 
 TEST(KQuantized, FormatTextParsingAcceptsOrRejectsWithTheRightLine) {
   const auto error = [](int line, const std::string& ending) {
@@ -77,11 +70,12 @@ TEST(KQuantized, SetValueRoundsHalfAwayFromZeroAndJudgesSaturationOnTheInput) {
   };
   const double inf = std::numeric_limits<double>::infinity();
   const Case cases[] = {
-      {1.0, 32, true, ""},        {0.015625, 1, true, ""},  {-0.015625, -1, true, ""},
-      {0.0468750, 2, true, ""},   {-0.0, 0, true, ""},      {3.96875, 127, true, ""},
-      {3.97, 127, false, kHigh},  {-4.0, -128, true, ""},   {-4.001, -128, false, kLow},
-      {inf, 127, false, kHigh},   {-inf, -128, false, kLow},
-      {std::nan(""), 0, false, ""},  // no information: raw 0, no line
+      {1.0, 32, true, ""},         {0.015625, 1, true, ""},
+      {-0.015625, -1, true, ""},   {0.0468750, 2, true, ""},
+      {-0.0, 0, true, ""},         {3.96875, 127, true, ""},
+      {3.97, 127, false, kHigh},   {-4.0, -128, true, ""},
+      {-4.001, -128, false, kLow}, {inf, 127, false, kHigh},
+      {-inf, -128, false, kLow},   {std::nan(""), 0, false, ""},  // no information: raw 0, no line
   };
   for (const Case& c : cases) {
     KQuantized q = llr(true);
@@ -221,3 +215,4 @@ TEST(KQuantized, WidestFormatStaysExact) {
 }
 
 }  // namespace
+}  // namespace brannoc::test

@@ -1,26 +1,19 @@
-// KTurboDecoderCModel: a code block of the transmitter decoded through the model library,
-// the error lines of every failure, and the model re-created on each generics change.
+// KTurboDecoderCModel: code blocks of the transmitter decoded through the model library, the
+// error lines of every failure, and the model re-created on each generics change.
 #include <gtest/gtest.h>
 
 #include <cstdint>
 #include <string>
 #include <vector>
 
+#include "DecoderTestSupport.h"
 #include "KTurboDecoderCModel.h"
 #include "tx/TurboEncoder.h"
 
+namespace brannoc::test {
 namespace {
 
-using brannoc::KTurboDecoderCModel;
-
-const std::string kPrefix = "File: ../s/KTurboDecoderCModel(";
-
-std::vector<std::int32_t> softOf(const brannoc::tx::Bits& bits) {
-  std::vector<std::int32_t> soft;
-  for (std::uint8_t b : bits) soft.push_back(b != 0 ? 64 : -64);
-  return soft;
-}
-
+// A code block of K bits and its three streams from the transmitter as soft values +-64.
 struct Block {
   std::vector<std::uint8_t> c;
   std::vector<std::int32_t> sys, p1, p2;
@@ -31,143 +24,91 @@ Block encodedBlock(std::uint32_t K) {
   for (std::uint32_t k = 0; k < K; ++k) {
     block.c.push_back(static_cast<std::uint8_t>((k * 7 + k / 3) % 2));
   }
-  brannoc::tx::TurboCodeword d;
-  EXPECT_TRUE(brannoc::tx::turboEncode(block.c, d));
-  block.sys = softOf(d.d0);
-  block.p1 = softOf(d.d1);
-  block.p2 = softOf(d.d2);
+  tx::TurboCodeword d;
+  EXPECT_TRUE(tx::turboEncode(block.c, d));
+  for (auto [bits, soft] : {std::pair{&d.d0, &block.sys}, {&d.d1, &block.p1}, {&d.d2, &block.p2}}) {
+    for (std::uint8_t b : *bits) soft->push_back(b != 0 ? 64 : -64);
+  }
   return block;
 }
 
-TEST(KTurboDecoderCModel, FortyFourValueStreamsDecodeAFortyBitBlock) {
-  testing::internal::CaptureStderr();
+// The smallest block quietly with the defaults, the largest with every unit count and algorithm:
+// each change creates the model again.
+TEST(KTurboDecoderCModel, DecodesTransmitterBlocksWithEveryUnitCountAndAlgorithm) {
   KTurboDecoderCModel adapter;
-  const Block block = encodedBlock(40);
-  ASSERT_EQ(block.sys.size(), 44u);
+  const Block small = encodedBlock(40), large = encodedBlock(6144);
   std::vector<std::uint8_t> out;
-  EXPECT_TRUE(adapter.decode(block.sys, block.p1, block.p2, out, 4));
-  EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
-  EXPECT_EQ(out, block.c);
-}
-
-TEST(KTurboDecoderCModel, LargestBlockWithEveryAlgorithmAndUnitCount) {
-  KTurboDecoderCModel adapter;
-  const Block block = encodedBlock(6144);
+  EXPECT_EQ(stderrOf([&] { EXPECT_TRUE(adapter.decode(small.sys, small.p1, small.p2, out, 4)); }),
+            "");
+  EXPECT_EQ(out, small.c);
   for (std::uint32_t P : {1u, 2u, 4u, 8u}) {
     for (std::uint32_t type : {0u, 1u, 2u}) {
       ASSERT_TRUE(adapter.setNumPU(P));
       ASSERT_TRUE(adapter.setAlgorithmType(type));
-      EXPECT_EQ(adapter.getGenerics().processing_units, P);
-      EXPECT_EQ(adapter.getGenerics().algorithm, type);
-      std::vector<std::uint8_t> out;
-      ASSERT_TRUE(adapter.decode(block.sys, block.p1, block.p2, out, 1));
-      EXPECT_EQ(out, block.c) << "P " << P << ", algorithm " << type;
+      ASSERT_TRUE(adapter.decode(large.sys, large.p1, large.p2, out, 1));
+      EXPECT_EQ(out, large.c) << "P " << P << ", algorithm " << type;
     }
   }
 }
 
-TEST(KTurboDecoderCModel, StreamsOfDifferentLengthsAreRefused) {
-  KTurboDecoderCModel adapter;
-  const Block block = encodedBlock(40);
-  std::vector<std::int32_t> shorter = block.p2;
+// Every failure prints its line and leaves the output alone. A refused generics word stays:
+// with 3 units every later change fails too, until a creation with good generics.
+TEST(KTurboDecoderCModel, FailuresPrintTheirLineAndLeaveTheOutput) {
+  KTurboDecoderCModel adapter, broken;
+  const Block b = encodedBlock(40);
+  std::vector<std::int32_t> shorter = b.p2;
   shorter.pop_back();
-  const std::string line =
-      kPrefix + "151)ERROR:KTurboDecoderCModel:LLRs should all be the same size\n";
-  for (int which = 0; which < 2; ++which) {
-    std::vector<std::uint8_t> out{7, 7};
-    testing::internal::CaptureStderr();
-    const bool decoded = which == 0 ? adapter.decode(block.sys, shorter, block.p2, out, 4)
-                                    : adapter.decode(block.sys, block.p1, shorter, out, 4);
-    EXPECT_FALSE(decoded);
-    EXPECT_EQ(testing::internal::GetCapturedStderr(), line);
-    EXPECT_EQ(out, (std::vector<std::uint8_t>{7, 7}));
-  }
-}
-
-TEST(KTurboDecoderCModel, ModelErrorCodesAreReported) {
-  KTurboDecoderCModel adapter;
-  const Block block = encodedBlock(40);
-  const std::vector<std::int32_t> length45(45, 3);
-  const std::vector<std::int32_t> empty;
-  struct Case {
-    const char* name;
-    const std::vector<std::int32_t>* streams;  // the same for all three, or null for block
-    std::uint32_t iterations;
-    std::int32_t code;
+  const std::vector<std::int32_t> length45(45, 3), empty;
+  std::vector<std::uint8_t> out{7, 7};
+  const auto decode = [&](KTurboDecoderCModel& a, const std::vector<std::int32_t>& sys,
+                          const std::vector<std::int32_t>& p1, const std::vector<std::int32_t>& p2,
+                          std::uint32_t iterations) {
+    return
+        [&a, &sys, &p1, &p2, iterations, &out] { return a.decode(sys, p1, p2, out, iterations); };
   };
-  const Case cases[] = {
-      {"K 41 is no block size", &length45, 4, VEXLON_IP_CORVANE_BAD_BLOCK_SIZE},
-      {"empty streams give K 0", &empty, 4, VEXLON_IP_CORVANE_BAD_BLOCK_SIZE},
-      {"no iterations", nullptr, 0, VEXLON_IP_CORVANE_BAD_ITERATIONS},
-      {"17 iterations", nullptr, 17, VEXLON_IP_CORVANE_BAD_ITERATIONS},
-  };
-  for (const Case& c : cases) {
-    std::vector<std::uint8_t> out{5};
-    testing::internal::CaptureStderr();
-    const bool decoded =
-        c.streams != nullptr
-            ? adapter.decode(*c.streams, *c.streams, *c.streams, out, c.iterations)
-            : adapter.decode(block.sys, block.p1, block.p2, out, c.iterations);
-    EXPECT_FALSE(decoded) << c.name;
-    EXPECT_EQ(testing::internal::GetCapturedStderr(),
-              kPrefix + "203)ERROR:KTurboDecoderCModel:Model returned error code " +
-                  std::to_string(c.code) + "\n")
-        << c.name;
-    EXPECT_EQ(out, std::vector<std::uint8_t>{5}) << c.name;
-  }
-}
+  const std::string line = "File: ../s/KTurboDecoderCModel(";
+  const std::string sameSize =
+      line + "151)ERROR:KTurboDecoderCModel:LLRs should all be the same size\n";
+  const std::string code = line + "203)ERROR:KTurboDecoderCModel:Model returned error code ";
+  const std::string notCreated = line + "142)ERROR:KTurboDecoderCModel:Decoder not yet created\n";
+  const std::string notCreatable =
+      line + "117)ERROR:KTurboDecoderCModel:Could not create decoder model\n";
+  expectRefusals({
+      {decode(adapter, b.sys, shorter, b.p2, 4), sameSize},
+      {decode(adapter, b.sys, b.p1, shorter, 4), sameSize},
+      {decode(adapter, length45, length45, length45, 4),  // K 41 is no block size
+       code + std::to_string(VEXLON_IP_CORVANE_BAD_BLOCK_SIZE) + "\n"},
+      {decode(adapter, empty, empty, empty, 4),  // K 0
+       code + std::to_string(VEXLON_IP_CORVANE_BAD_BLOCK_SIZE) + "\n"},
+      {decode(adapter, b.sys, b.p1, b.p2, 0),
+       code + std::to_string(VEXLON_IP_CORVANE_BAD_ITERATIONS) + "\n"},
+      {decode(adapter, b.sys, b.p1, b.p2, 17),
+       code + std::to_string(VEXLON_IP_CORVANE_BAD_ITERATIONS) + "\n"},
+      {[&] { return broken.setNumPU(3); }, notCreatable},
+      {decode(broken, b.sys, b.p1, b.p2, 4), notCreated},
+      {[&] { return broken.setAlgorithmType(2); }, notCreatable},
+  });
+  EXPECT_EQ(out, (std::vector<std::uint8_t>{7, 7}));
 
-TEST(KTurboDecoderCModel, FailedCreationLeavesNoDecoderUntilACreationSucceeds) {
-  KTurboDecoderCModel adapter;
-  const Block block = encodedBlock(40);
-  testing::internal::CaptureStderr();
-  EXPECT_FALSE(adapter.setNumPU(3));
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            kPrefix + "117)ERROR:KTurboDecoderCModel:Could not create decoder model\n");
-  EXPECT_EQ(adapter.getGenerics().processing_units, 3u);
-
-  std::vector<std::uint8_t> out;
-  testing::internal::CaptureStderr();
-  EXPECT_FALSE(adapter.decode(block.sys, block.p1, block.p2, out, 4));
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            kPrefix + "142)ERROR:KTurboDecoderCModel:Decoder not yet created\n");
-  EXPECT_TRUE(out.empty());
-
-  testing::internal::CaptureStderr();
-  EXPECT_FALSE(adapter.setAlgorithmType(9));  // P is still 3
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            kPrefix + "117)ERROR:KTurboDecoderCModel:Could not create decoder model\n");
-  vexlon_ip_corvane_generics generics = adapter.getGenerics();
+  vexlon_ip_corvane_generics generics = broken.getGenerics();
   generics.processing_units = 4;
-  generics.algorithm = 2;
-  EXPECT_TRUE(adapter.createModel(generics));
-  EXPECT_TRUE(adapter.decode(block.sys, block.p1, block.p2, out, 4));
-  EXPECT_EQ(out, block.c);
+  EXPECT_TRUE(broken.createModel(generics));
+  EXPECT_TRUE(broken.decode(b.sys, b.p1, b.p2, out, 4));
+  EXPECT_EQ(out, b.c);
+  EXPECT_EQ(broken.destroyModel(), 0);
+  EXPECT_EQ(broken.destroyModel(), 0);
+  expectRefusals({{decode(broken, b.sys, b.p1, b.p2, 4), notCreated}});
 
-  EXPECT_EQ(adapter.destroyModel(), 0);
-  EXPECT_EQ(adapter.destroyModel(), 0);
-  testing::internal::CaptureStderr();
-  EXPECT_FALSE(adapter.decode(block.sys, block.p1, block.p2, out, 4));
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            kPrefix + "142)ERROR:KTurboDecoderCModel:Decoder not yet created\n");
-}
-
-TEST(KTurboDecoderCModel, ConstructorsReportAModelThatCannotBeCreated) {
-  vexlon_ip_corvane_generics generics = vexlon_ip_corvane_get_default_generics();
+  // The constructors report a model that cannot be made; a later change can make one.
+  generics = vexlon_ip_corvane_get_default_generics();
   generics.extrinsic_bits = 3;
-  testing::internal::CaptureStderr();
-  const auto adapter = KTurboDecoderCModel::create(generics);
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            kPrefix + "98)ERROR:KTurboDecoderCModel:Could not create decoder model\n");
-  ASSERT_NE(adapter, nullptr);
-  EXPECT_EQ(adapter->getGenerics().extrinsic_bits, 3u);
-  EXPECT_TRUE(adapter->setExtrinsicBits(9));
-
-  testing::internal::CaptureStderr();
-  const auto byDefault = KTurboDecoderCModel::create();
-  EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
-  EXPECT_EQ(byDefault->getGenerics().processing_units, 2u);
-  EXPECT_EQ(byDefault->getGenerics().algorithm, 1u);
+  std::unique_ptr<KTurboDecoderCModel> made;
+  EXPECT_EQ(stderrOf([&] { made = KTurboDecoderCModel::create(generics); }),
+            line + "98)ERROR:KTurboDecoderCModel:Could not create decoder model\n");
+  ASSERT_NE(made, nullptr);
+  EXPECT_TRUE(made->setExtrinsicBits(9));
+  EXPECT_EQ(stderrOf([&] { made = KTurboDecoderCModel::create(); }), "");
 }
 
 }  // namespace
+}  // namespace brannoc::test

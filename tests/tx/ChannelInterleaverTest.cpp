@@ -11,16 +11,9 @@
 namespace brannoc::tx {
 namespace {
 
-TEST(ChannelInterleaver, ColumnSetsOfTheStandardTables) {
-  using Set = std::array<std::uint32_t, 4>;
-  EXPECT_EQ(riColumnSet(CyclicPrefix::Normal), (Set{1, 4, 7, 10}));
-  EXPECT_EQ(riColumnSet(CyclicPrefix::Extended), (Set{0, 3, 5, 8}));
-  EXPECT_EQ(ackColumnSet(CyclicPrefix::Normal), (Set{2, 3, 8, 9}));
-  EXPECT_EQ(ackColumnSet(CyclicPrefix::Extended), (Set{1, 2, 6, 7}));
-}
-
 // Matrix of 4 rows, Qm = 2. Each entry's value names its source: the multiplexed vector
-// index k (CQI first, then data), or kRiTag + i / kAckTag + i for control symbol i.
+// index k (CQI first, then data), or kRiTag + i / kAckTag + i for control symbol i. The cells
+// of the first four symbols of each give the column sets of the standard's tables.
 TEST(ChannelInterleaver, ControlSymbolsFillTheirColumnsFromTheBottomRow) {
   constexpr std::uint8_t kRiTag = 200, kAckTag = 220;
   const std::uint32_t Qm = 2, Rmux = 4;

@@ -68,7 +68,9 @@ TEST(TurboEncoder, TailBitsOfHandWorkedImpulses) {
   }
 }
 
-TEST(TurboEncoder, FillerBitsEnterAsZeroAndLeaveAsNull) {
+// Fillers enter as 0 and leave as <NULL> in d0 and d1; sizes outside the table and elements
+// other than bits and fillers are refused.
+TEST(TurboEncoder, FillerBitsEnterAsZeroAndLeaveAsNullOtherInputsAreRefused) {
   Bits c(56, 0);
   for (std::uint32_t k = 8; k < 56; ++k) c[k] = (k * 5 + 3) % 7 < 3;
   Bits withFillers = c;
@@ -82,16 +84,12 @@ TEST(TurboEncoder, FillerBitsEnterAsZeroAndLeaveAsNull) {
     EXPECT_EQ(stream(filled, i), expected) << "d" << i;
   }
   EXPECT_EQ(filled.d2, plain.d2);
-}
-
-TEST(TurboEncoder, RefusesSizesOutsideTheTableAndNonBits) {
-  TurboCodeword d;
-  EXPECT_FALSE(turboEncode(Bits(41, 0), d));
-  EXPECT_TRUE(d.d0.empty() && d.d1.empty() && d.d2.empty());
-  EXPECT_FALSE(turboEncode(Bits{}, d));
-  Bits c(40, 0);
+  EXPECT_FALSE(turboEncode(Bits(41, 0), filled));
+  EXPECT_TRUE(filled.d0.empty() && filled.d1.empty() && filled.d2.empty());
+  EXPECT_FALSE(turboEncode(Bits{}, filled));
+  c.resize(40);
   c[5] = 3;
-  EXPECT_FALSE(turboEncode(c, d));
+  EXPECT_FALSE(turboEncode(c, filled));
 }
 
 }  // namespace
