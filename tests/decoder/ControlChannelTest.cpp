@@ -30,6 +30,20 @@ struct CchCall {
   std::array<std::uint8_t, 4> ack{};
   vexlon_ip_brannoc_CCH_outputs outputs{cqi.data(), ack.data(), 16, 4, 0, 0, 0};
 
+  CchCall() = default;
+  // A copy writes into its own arrays.
+  CchCall(const CchCall& other) { *this = other; }
+  CchCall& operator=(const CchCall& other) {
+    llr = other.llr;
+    control = other.control;
+    cqi = other.cqi;
+    ack = other.ack;
+    outputs = other.outputs;
+    outputs.CCH_data_out = cqi.data();
+    outputs.CCH_ACK_out = ack.data();
+    return *this;
+  }
+
   std::int32_t run(vexlon_ip_brannoc_state* state) {
     const vexlon_ip_brannoc_CCH_inputs inputs{llr.data(), static_cast<std::uint32_t>(llr.size()),
                                               control};
@@ -242,7 +256,8 @@ TEST(ControlChannel, UncacheableInputIsOutOfMemory) {
   rlimit saved{};
   const bool limited = sizeof(void*) == 8 && getrlimit(RLIMIT_AS, &saved) == 0;
   if (limited) {
-    const rlimit tight{std::uint64_t{8} << 30, saved.rlim_max};  // below the 16 GiB asked for
+    // Below the 16 GiB asked for (only the 64-bit build gets here).
+    const rlimit tight{static_cast<rlim_t>(std::uint64_t{8} << 30), saved.rlim_max};
     ASSERT_EQ(setrlimit(RLIMIT_AS, &tight), 0);
   }
   std::int32_t status = -1;

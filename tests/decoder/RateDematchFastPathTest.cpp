@@ -1,18 +1,15 @@
-// Fast paths against their references: the rate dematcher's integer adder against the
+// The rate dematcher's fast paths against their references: the integer adder against the
 // KQuantized one and its mapped scatter against the step-by-step tables, llrCollect and
 // deinterleaveData (random transport blocks, rates, redundancy versions, soft values anywhere
-// in 32 bits); the table-driven CRC against the transmitter's independent bit-serial one.
+// in 32 bits). The table-driven CRC meets the transmitter's bit-serial one in its own tests.
 #include <gtest/gtest.h>
 
 #include <cstdint>
 #include <limits>
 #include <random>
-#include <utility>
 #include <vector>
 
-#include "KCRCGenerator.h"
 #include "KRateDeMatch.h"
-#include "tx/Crc.h"
 
 namespace brannoc::test {
 namespace {
@@ -63,33 +60,6 @@ TEST(RateDematchFastPath, MappedScatterEqualsTheReferenceChain) {
       ASSERT_TRUE(reference.rateDematchDataReference(in, b, r));
       ASSERT_EQ(a, b) << "TB " << tb << ", G " << G << ", Qm " << Qm << ", rv " << rv << ", block "
                       << r;
-    }
-  }
-}
-
-TEST(CrcFastPath, TableDrivenParityEqualsTheBitSerialOne) {
-  std::mt19937 rng(3);
-  KCRCGenerator crc;
-  const std::pair<void (KCRCGenerator::*)(), tx::CrcType> polynomials[] = {
-      {&KCRCGenerator::setCRC24A, tx::CrcType::Crc24A},
-      {&KCRCGenerator::setCRC24B, tx::CrcType::Crc24B},
-      {&KCRCGenerator::setCRC16, tx::CrcType::Crc16},
-      {&KCRCGenerator::setCRC8, tx::CrcType::Crc8}};
-  for (const auto& [select, type] : polynomials) {
-    (crc.*select)();
-    for (std::size_t n = 1; n < 200; ++n) {
-      std::vector<std::uint8_t> data(n);
-      for (auto& bit : data) bit = rng() & 1;
-      std::vector<std::uint8_t> coded;
-      ASSERT_TRUE(crc.generate(data, coded, 0));
-      ASSERT_EQ(coded, tx::attachCrc(data, type)) << n << " bits";
-      std::uint8_t pass = 0;
-      std::vector<std::uint8_t> back;
-      ASSERT_TRUE(crc.check(coded, back, pass, 0));
-      EXPECT_EQ(pass, 1);
-      coded[rng() % coded.size()] ^= 1;
-      ASSERT_TRUE(crc.check(coded, back, pass, 0));
-      EXPECT_EQ(pass, 0) << n << " bits, one flipped";
     }
   }
 }
