@@ -7,6 +7,8 @@
 #include <cstdint>
 #include <filesystem>
 #include <random>
+#include <regex>
+#include <sstream>
 #include <string>
 #include <thread>
 #include <vector>
@@ -122,112 +124,88 @@ TEST(ControlChannel, NoisyCqiIsDecodedInNearlyEveryCall) {
   EXPECT_GE(right, kCalls * 97 / 100);
 }
 
-struct StatusCase {
-  const char* name;
-  void (*change)(CchCall&, vexlon_ip_brannoc_state*&, vexlon_ip_brannoc_CCH_outputs*&);
-  std::int32_t status;
-  const char* lines;  // "#" stands for a line number
-};
-
 constexpr const char* kIf = "File: ../s/brannoc_bitacc_cmodel.cpp(#)";
 
-class ControlChannelStatus : public testing::TestWithParam<StatusCase> {};
-
-// A valid call (4 CQI bits, 1 ACK bit, normal cyclic prefix) broken in one way.
-TEST_P(ControlChannelStatus, ReportsItsCodeAndLine) {
-  const StatusCase& c = GetParam();
-  Instance instance;
-  std::mt19937 rng(1);
-  CchCall call = transmission(randomPayload(4, 1, rng), CyclicPrefix::Normal, {});
-  vexlon_ip_brannoc_state* state = instance.get();
-  vexlon_ip_brannoc_CCH_outputs* outputs = &call.outputs;
-  c.change(call, state, outputs);
-  const vexlon_ip_brannoc_CCH_inputs inputs{call.llr.empty() ? nullptr : call.llr.data(),
-                                            static_cast<std::uint32_t>(call.llr.size()),
-                                            call.control};
-  std::int32_t status = -1;
-  const std::string err =
-      stderrOf([&] { status = vexlon_ip_brannoc_CCH_bitacc_simulate(state, inputs, outputs); });
-  EXPECT_EQ(status, c.status);
-  expectLines(err, c.lines);
-  EXPECT_EQ(call.outputs.CCH_TAG_out, 0u);  // written on success only
-}
-
-using Out = vexlon_ip_brannoc_CCH_outputs*;
-using St = vexlon_ip_brannoc_state*;
-
-INSTANTIATE_TEST_SUITE_P(
-    Codes, ControlChannelStatus,
-    testing::Values(
-        StatusCase{"NullState", [](CchCall&, St& s, Out&) { s = nullptr; }, 500,
-                   "File: ../s/brannoc_bitacc_cmodel.cpp(#)ERROR:PUCCH decoder:Simulate called "
-                   "with null state structure\n"},
-        StatusCase{"NullOutputs", [](CchCall&, St&, Out& o) { o = nullptr; }, 501,
-                   "*ERROR:PUCCH decoder:Simulate called with null output structure\n"},
-        StatusCase{
-            "CqiSize", [](CchCall& c, St&, Out&) { c.control.CCH_UCI_OP_SIZE = 14; }, 502,
-            "*)ERROR:PUCCH decoder:Simulate called with inputs.controlData.CCH_UCI_OP_SIZE>13\n"},
-        StatusCase{"CyclicPrefix", [](CchCall& c, St&, Out&) { c.control.CCH_CP = 2; }, 503,
-                   "*)ERROR:PUCCH decoder:Simulate called with inputs.controlData.CCH_CP>1\n"},
-        StatusCase{
-            "AckSize", [](CchCall& c, St&, Out&) { c.control.CCH_ACK_OP_SIZE = 3; }, 504,
-            "*)ERROR:PUCCH decoder:Simulate called with inputs.controlData.CCH_ACK_OP_SIZE>2\n"},
-        StatusCase{
-            "UserId", [](CchCall& c, St&, Out&) { c.control.CCH_USER_ID = 65536; }, 505,
-            "*)ERROR:PUCCH decoder:Simulate called with inputs.controlData.CCH_USER_ID>65535\n"},
-        StatusCase{"ExtendedTooLong",
-                   [](CchCall& c, St&, Out&) {
-                     c.control = {12, 1, 2, 0, 0};
-                   },
-                   506,
-                   "../s/KLTE_PUCCH_Decoding(#)Error:CCH CQI+ACK max 13 bits. \n"
-                   "File: ../s/brannoc_bitacc_cmodel.cpp(#)Error: UNABLE TO SET CCH PARAMETERS\n"},
-        StatusCase{"EmptyInput", [](CchCall& c, St&, Out&) { c.llr.clear(); }, 600,
-                   "../s/KLTE_PUCCH_Decoding(#)INCORRECT TB SIZE. size=0 "
-                   "tbCRC.size()+itsRateDematch.getACKsize()=21\n*Error: Could not decode CCH\n"},
-        StatusCase{"NullCqiArray", [](CchCall&, St&, Out& o) { o->CCH_data_out = nullptr; }, 509,
-                   "*)ERROR:PUCCH decoder:Simulate called with null pointer for "
-                   "outputs->CCH_data_out\n"},
-        StatusCase{"NullAckArray", [](CchCall&, St&, Out& o) { o->CCH_ACK_out = nullptr; }, 510,
-                   "*)ERROR:PUCCH decoder:Simulate called with null pointer for "
-                   "outputs->CCH_ACK_out\n"},
-        StatusCase{"LongInput", [](CchCall& c, St&, Out&) { c.llr.push_back(1); }, 600,
-                   "../s/KLTE_PUCCH_Decoding(#)INCORRECT TB SIZE. size=22 "
-                   "tbCRC.size()+itsRateDematch.getACKsize()=21\n"
-                   "File: ../s/brannoc_bitacc_cmodel.cpp(#)Error: Could not decode CCH\n"},
-        StatusCase{"ShortAckOnlyInput",
-                   [](CchCall& c, St&, Out&) {
-                     c.control = {0, 0, 2, 0, 0};
-                     c.llr.resize(1);
-                   },
-                   600,
-                   "../s/KLTE_PUCCH_Decoding(#)INCORRECT TB SIZE. size=1 "
-                   "itsRateDematch.getACKsize()=2\n*Error: Could not decode CCH\n"},
-        StatusCase{
-            "NothingToDecode",
-            [](CchCall& c, St&, Out&) {
-              c.control = {0, 1, 0, 0, 0};
-            },
-            600,
-            "../s/KLTE_PUCCH_Decoding(#)Error: No CCH data. \n*)Error: Could not decode CCH\n"},
-        StatusCase{"SmallCqiArray", [](CchCall&, St&, Out& o) { o->max_CCH_data_out_size = 3; },
-                   701, "*)ERROR:decoder:Insufficient allocated space for CCH Data output array\n"},
-        StatusCase{"SmallAckArray", [](CchCall&, St&, Out& o) { o->max_CCH_ACK_out_size = 0; }, 702,
-                   "*)ERROR:decoder:Insufficient allocated space for CCH ACK Data output array\n"}),
-    [](const testing::TestParamInfo<StatusCase>& info) { return info.param.name; });
-
-TEST(ControlChannel, NullLlrWithASizeIsRefused) {
-  Instance instance;
-  CchCall call;
-  call.control = {0, 0, 1, 0, 0};
-  const vexlon_ip_brannoc_CCH_inputs inputs{nullptr, 1, call.control};
-  std::int32_t status = -1;
-  const std::string err = stderrOf([&] {
-    status = vexlon_ip_brannoc_CCH_bitacc_simulate(instance.get(), inputs, &call.outputs);
-  });
-  EXPECT_EQ(status, 508);
-  expectLines(err, std::string(kIf) +
-                       "ERROR:PUCCH decoder:Simulate called with null pointer for inputs.llr\n");
+// A valid call (4 CQI bits, 1 ACK bit, normal cyclic prefix) broken in one way each: its
+// status and lines (a line without "../s/" is the interface's; "@" stands for the argument
+// checks' "ERROR:PUCCH decoder:Simulate called with "); nothing is written.
+TEST(ControlChannel, EveryStatusCodeWithItsLines) {
+  using C = CchCall;
+  using S = vexlon_ip_brannoc_state*;
+  using O = vexlon_ip_brannoc_CCH_outputs*;
+  using U = std::uint32_t;
+  const struct {
+    void (*change)(C&, S&, O&, U&);
+    std::int32_t status;
+    const char* lines;
+  } cases[] = {
+      {[](C&, S& s, O&, U&) { s = nullptr; }, 500, "@null state structure"},
+      {[](C&, S&, O& o, U&) { o = nullptr; }, 501, "@null output structure"},
+      {[](C& c, S&, O&, U&) { c.control.CCH_UCI_OP_SIZE = 14; }, 502,
+       "@inputs.controlData.CCH_UCI_OP_SIZE>13"},
+      {[](C& c, S&, O&, U&) { c.control.CCH_CP = 2; }, 503, "@inputs.controlData.CCH_CP>1"},
+      {[](C& c, S&, O&, U&) { c.control.CCH_ACK_OP_SIZE = 3; }, 504,
+       "@inputs.controlData.CCH_ACK_OP_SIZE>2"},
+      {[](C& c, S&, O&, U&) { c.control.CCH_USER_ID = 65536; }, 505,
+       "@inputs.controlData.CCH_USER_ID>65535"},
+      {[](C& c, S&, O&, U&) {
+         c.control = {12, 1, 2, 0, 0};
+       },
+       506,
+       "../s/KLTE_PUCCH_Decoding(#)Error:CCH CQI+ACK max 13 bits. \n"
+       "Error: UNABLE TO SET CCH PARAMETERS"},
+      {[](C& c, S&, O&, U& size) { c.llr.clear(), size = 1; }, 508, "@null pointer for inputs.llr"},
+      {[](C&, S&, O& o, U&) { o->CCH_data_out = nullptr; }, 509,
+       "@null pointer for outputs->CCH_data_out"},
+      {[](C&, S&, O& o, U&) { o->CCH_ACK_out = nullptr; }, 510,
+       "@null pointer for outputs->CCH_ACK_out"},
+      {[](C& c, S&, O&, U&) { c.llr.clear(); }, 600,
+       "../s/KLTE_PUCCH_Decoding(#)INCORRECT TB SIZE. size=0 "
+       "tbCRC.size()+itsRateDematch.getACKsize()=21\nError: Could not decode CCH"},
+      {[](C& c, S&, O&, U&) { c.llr.push_back(1); }, 600,
+       "../s/KLTE_PUCCH_Decoding(#)INCORRECT TB SIZE. size=22 "
+       "tbCRC.size()+itsRateDematch.getACKsize()=21\nError: Could not decode CCH"},
+      // ACK alone reads one soft value per bit and no further.
+      {[](C& c, S&, O&, U&) {
+         c.control = {0, 0, 2, 0, 0}, c.llr.resize(1);
+       },
+       600,
+       "../s/KLTE_PUCCH_Decoding(#)INCORRECT TB SIZE. size=1 itsRateDematch.getACKsize()=2\n"
+       "Error: Could not decode CCH"},
+      {[](C& c, S&, O&, U&) {
+         c.control = {0, 1, 0, 0, 0};
+       },
+       600, "../s/KLTE_PUCCH_Decoding(#)Error: No CCH data. \nError: Could not decode CCH"},
+      {[](C&, S&, O& o, U&) { o->max_CCH_data_out_size = 3; }, 701,
+       "ERROR:decoder:Insufficient allocated space for CCH Data output array"},
+      {[](C&, S&, O& o, U&) { o->max_CCH_ACK_out_size = 0; }, 702,
+       "ERROR:decoder:Insufficient allocated space for CCH ACK Data output array"},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.status);
+    Instance instance;
+    std::mt19937 rng(1);
+    CchCall call = transmission(randomPayload(4, 1, rng), CyclicPrefix::Normal, {});
+    vexlon_ip_brannoc_state* state = instance.get();
+    vexlon_ip_brannoc_CCH_outputs* outputs = &call.outputs;
+    std::uint32_t size = 0;
+    c.change(call, state, outputs, size);
+    const vexlon_ip_brannoc_CCH_inputs inputs{
+        call.llr.empty() ? nullptr : call.llr.data(),
+        size != 0 ? size : static_cast<std::uint32_t>(call.llr.size()), call.control};
+    std::int32_t status = -1;
+    const std::string err =
+        stderrOf([&] { status = vexlon_ip_brannoc_CCH_bitacc_simulate(state, inputs, outputs); });
+    EXPECT_EQ(status, c.status);
+    std::string lines;
+    std::stringstream text(std::regex_replace(std::string(c.lines), std::regex("@"),
+                                              "ERROR:PUCCH decoder:Simulate called with "));
+    for (std::string line; std::getline(text, line);) {
+      lines += (line.rfind("../s/", 0) == 0 ? "" : kIf) + line + "\n";
+    }
+    expectLines(err, lines);
+    EXPECT_EQ(call.outputs.CCH_TAG_out, 0u);  // written on success only
+  }
 }
 
 // A failure at the ACK copy leaves the CQI bits written.

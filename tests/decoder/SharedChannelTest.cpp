@@ -12,6 +12,7 @@
 #include <cstdlib>
 #include <functional>
 #include <random>
+#include <regex>
 #include <string>
 #include <thread>
 #include <vector>
@@ -274,213 +275,174 @@ SchCall validCall() {
   return call;
 }
 
-struct StatusCase {
-  const char* name;
-  std::function<void(SchCall&, vexlon_ip_brannoc_state*&)> change;
-  std::int32_t status;
-  std::string line;  // after "File: ../s/brannoc_bitacc_cmodel.cpp(#)"; "*" any text before
-  std::uint32_t interleaverBuffer = 36864;
-};
+// Runs the valid call changed by change on an instance with the given interleaver buffer and
+// checks the status and the lines (those of the interface: "File:
+// ../s/brannoc_bitacc_cmodel.cpp(#)" and the text; a pattern starting with "*" is matched as it
+// is); no output is written.
+void expectStatus(const std::function<void(SchCall&, vexlon_ip_brannoc_state*&)>& change,
+                  std::int32_t status, const std::string& lines, std::uint32_t buffer = 36864) {
+  vexlon_ip_brannoc_generics generics = vexlon_ip_brannoc_get_default_generics();
+  generics.C_INTERLEAVER_BUFFER_SIZE = buffer;
+  Instance instance(generics);
+  SchCall call = validCall();
+  vexlon_ip_brannoc_state* state = instance.get();
+  change(call, state);
+  const vexlon_ip_brannoc_SCH_inputs inputs = call.inputs();
+  std::int32_t result = -1;
+  const std::string err = stderrOf(
+      [&] { result = vexlon_ip_brannoc_SCH_bitacc_simulate(state, inputs, &call.outputs); });
+  EXPECT_EQ(result, status);
+  expectLines(err, lines.front() == '*' ? lines + "\n"
+                                        : "File: ../s/brannoc_bitacc_cmodel.cpp(#)" + lines + "\n");
+  EXPECT_EQ(call.outputs.SCH_TAG_out, 0u);
+  if (status < 300) {
+    EXPECT_EQ(call.data[0], 9) << "an output was written";
+  }
+}
 
 const std::string kCalled = "ERROR:decoder:Simulate called with ";
 
-std::vector<StatusCase> statusCases() {
+// One control field out of range or inconsistent, in the order of the checks.
+TEST(SharedChannelStatus, FieldChecks) {
+  using D = vexlon_ip_brannoc_SCH_controlData;
+  const struct {
+    std::uint32_t D::*field;
+    std::uint32_t value;
+    std::int32_t status;
+    const char* message;  // after "Simulate called with "; "@" stands for "inputs.controlData."
+  } cases[] = {
+      {&D::SCH_CQI_IP_SIZE, 4096, 103, "@SCH_CQI_IP_SIZE>4095"},
+      {&D::SCH_CQI_OP_SIZE, 128, 104, "@SCH_CQI_OP_SIZE>127"},
+      {&D::SCH_CQI_OP_SIZE, 1, 105, "@SCH_CQI_IP_SIZE<SCH_CQI_OP_SIZE"},
+      {&D::SCH_IP_DATA_TYPE, 3, 106, "SCH_IP_DATA_TYPE=CQI and @SCH_CQI_OP_SIZE=0"},
+      {&D::SCH_IP_DATA_TYPE, 16, 107, "@SCH_IP_DATA_TYPE>15"},
+      {&D::SCH_ACK_IP_SIZE, 256, 108, "@SCH_ACK_IP_SIZE>255"},
+      {&D::SCH_ACK_OP_SIZE, 3, 109, "@SCH_ACK_OP_SIZE>2"},
+      {&D::SCH_ACK_OP_SIZE, 1, 110, "@SCH_ACK_IP_SIZE<SCH_ACK_OP_SIZE"},
+      {&D::SCH_IP_DATA_TYPE, 5, 111, "SCH_IP_DATA_TYPE=ACK and @SCH_ACK_OP_SIZE=0"},
+      {&D::SCH_RI_IP_SIZE, 256, 112, "@SCH_RI_IP_SIZE>255"},
+      {&D::SCH_RI_OP_SIZE, 3, 113, "@SCH_RI_OP_SIZE>2"},
+      {&D::SCH_RI_OP_SIZE, 2, 114, "@SCH_RI_IP_SIZE<SCH_RI_OP_SIZE"},
+      {&D::SCH_IP_DATA_TYPE, 9, 115, "SCH_IP_DATA_TYPE=RI and @SCH_RI_OP_SIZE=0"},
+      {&D::SCH_RM_E_IDX, 128, 116, "@SCH_RM_E_IDX>127"},
+      {&D::SCH_CH_INT_ROWS, 2048, 117, "@SCH_CH_INT_ROWS>2047"},
+      {&D::SCH_CH_INT_ROWS, 0, 118, "@SCH_CH_INT_ROWS=0"},
+      {&D::SCH_CP, 2, 120, "@SCH_CP>1"},
+      {&D::SCH_RM_E_MINUS, 65536, 121, "@SCH_RM_E_MINUS>65535"},
+      {&D::SCH_RM_E_PLUS, 0xFFFFFFFF, 122, "@SCH_RM_E_PLUS>65535"},
+      {&D::SCH_RM_E_MINUS, 0, 123, "SCH_IP_DATA_TYPE=DATA and @SCH_RM_E_MINUS=0"},
+      {&D::SCH_TBSIZE, 262144, 124, "@SCH_TBSIZE>262143"},
+      {&D::SCH_TBSIZE, 0, 125, "SCH_IP_DATA_TYPE=DATA and @SCH_TBSIZE=0"},
+      {&D::SCH_TD_ITER, 16, 127, "@SCH_TD_ITER>15"},
+      {&D::SCH_TD_ITER, 0, 128, "SCH_IP_DATA_TYPE=DATA and @SCH_TD_ITER=0"},
+      {&D::SCH_QAM, 7, 129, "@SCH_QAM>2 = 7"},
+      {&D::SCH_USER_ID, 65536, 130, "@SCH_USER_ID>65535"},
+      {&D::SCH_SFRM, 16, 131, "@SCH_SFRM>15"},
+      {&D::SCH_HARQ_SFRM, 16, 132, "@SCH_HARQ_SFRM>15"},
+      {&D::SCH_RV, 4, 133, "@SCH_RV>3"},
+      {&D::SCH_ND, 2, 134, "@SCH_ND>1"},
+      {&D::SCH_HFC, 2, 135, "@SCH_HFC>1"},
+      {&D::SCH_TD_FLUSH, 2, 167, "@SCH_TD_FLUSH>1"},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.status);
+    const std::string message =
+        std::regex_replace(std::string(c.message), std::regex("@"), "inputs.controlData.");
+    expectStatus([&c](SchCall& call, auto&) { call.control.*c.field = c.value; }, c.status,
+                 kCalled + message);
+  }
+}
+
+// Arrays, capacities, sizes and the decode itself.
+TEST(SharedChannelStatus, ArrayAndSizeChecks) {
   using C = SchCall;
   using S = vexlon_ip_brannoc_state*;
-  const auto field = [](std::uint32_t vexlon_ip_brannoc_SCH_controlData::*member,
-                        std::uint32_t value) {
-    return [member, value](C& c, S&) { c.control.*member = value; };
+  const auto retransmit = [](C& c, std::uint32_t size) {
+    c.control.SCH_ND = 0;
+    c.harqSize = size;
+    for (auto& h : c.harqIn) h.assign(size, 0);
   };
-  using D = vexlon_ip_brannoc_SCH_controlData;
-  const std::string cd = kCalled + "inputs.controlData.";
-  return {
-      {"NullState", [](C&, S& s) { s = nullptr; }, 101, kCalled + "null state structure"},
-      {"CqiIp", field(&D::SCH_CQI_IP_SIZE, 4096), 103, cd + "SCH_CQI_IP_SIZE>4095"},
-      {"CqiOp", field(&D::SCH_CQI_OP_SIZE, 128), 104, cd + "SCH_CQI_OP_SIZE>127"},
-      {"CqiIpBelowOp", field(&D::SCH_CQI_OP_SIZE, 1), 105, cd + "SCH_CQI_IP_SIZE<SCH_CQI_OP_SIZE"},
-      {"CqiTypeNoBits", field(&D::SCH_IP_DATA_TYPE, 3), 106,
-       kCalled + "SCH_IP_DATA_TYPE=CQI and inputs.controlData.SCH_CQI_OP_SIZE=0"},
-      {"DataType", field(&D::SCH_IP_DATA_TYPE, 16), 107, cd + "SCH_IP_DATA_TYPE>15"},
-      {"AckIp", field(&D::SCH_ACK_IP_SIZE, 256), 108, cd + "SCH_ACK_IP_SIZE>255"},
-      {"AckOp", field(&D::SCH_ACK_OP_SIZE, 3), 109, cd + "SCH_ACK_OP_SIZE>2"},
-      {"AckIpBelowOp", field(&D::SCH_ACK_OP_SIZE, 1), 110, cd + "SCH_ACK_IP_SIZE<SCH_ACK_OP_SIZE"},
-      {"AckTypeNoBits", field(&D::SCH_IP_DATA_TYPE, 5), 111,
-       kCalled + "SCH_IP_DATA_TYPE=ACK and inputs.controlData.SCH_ACK_OP_SIZE=0"},
-      {"RiIp", field(&D::SCH_RI_IP_SIZE, 256), 112, cd + "SCH_RI_IP_SIZE>255"},
-      {"RiOp", field(&D::SCH_RI_OP_SIZE, 3), 113, cd + "SCH_RI_OP_SIZE>2"},
-      {"RiIpBelowOp", field(&D::SCH_RI_OP_SIZE, 2), 114, cd + "SCH_RI_IP_SIZE<SCH_RI_OP_SIZE"},
-      {"RiTypeNoBits", field(&D::SCH_IP_DATA_TYPE, 9), 115,
-       kCalled + "SCH_IP_DATA_TYPE=RI and inputs.controlData.SCH_RI_OP_SIZE=0"},
-      {"EIdx", field(&D::SCH_RM_E_IDX, 128), 116, cd + "SCH_RM_E_IDX>127"},
-      {"Rows", field(&D::SCH_CH_INT_ROWS, 2048), 117, cd + "SCH_CH_INT_ROWS>2047"},
-      {"NoRows", field(&D::SCH_CH_INT_ROWS, 0), 118, cd + "SCH_CH_INT_ROWS=0"},
-      {"Cp", field(&D::SCH_CP, 2), 120, cd + "SCH_CP>1"},
-      {"EMinus", field(&D::SCH_RM_E_MINUS, 65536), 121, cd + "SCH_RM_E_MINUS>65535"},
-      {"EPlus", field(&D::SCH_RM_E_PLUS, 0xFFFFFFFF), 122, cd + "SCH_RM_E_PLUS>65535"},
-      {"DataNoE", field(&D::SCH_RM_E_MINUS, 0), 123,
-       kCalled + "SCH_IP_DATA_TYPE=DATA and inputs.controlData.SCH_RM_E_MINUS=0"},
-      {"TbSize", field(&D::SCH_TBSIZE, 262144), 124, cd + "SCH_TBSIZE>262143"},
-      {"DataNoTb", field(&D::SCH_TBSIZE, 0), 125,
-       kCalled + "SCH_IP_DATA_TYPE=DATA and inputs.controlData.SCH_TBSIZE=0"},
-      {"Iterations", field(&D::SCH_TD_ITER, 16), 127, cd + "SCH_TD_ITER>15"},
-      {"DataNoIterations", field(&D::SCH_TD_ITER, 0), 128,
-       kCalled + "SCH_IP_DATA_TYPE=DATA and inputs.controlData.SCH_TD_ITER=0"},
-      {"Qam", field(&D::SCH_QAM, 7), 129, cd + "SCH_QAM>2 = 7"},
-      {"User", field(&D::SCH_USER_ID, 65536), 130, cd + "SCH_USER_ID>65535"},
-      {"Sfrm", field(&D::SCH_SFRM, 16), 131, cd + "SCH_SFRM>15"},
-      {"HarqSfrm", field(&D::SCH_HARQ_SFRM, 16), 132, cd + "SCH_HARQ_SFRM>15"},
-      {"Rv", field(&D::SCH_RV, 4), 133, cd + "SCH_RV>3"},
-      {"Nd", field(&D::SCH_ND, 2), 134, cd + "SCH_ND>1"},
-      {"Hfc", field(&D::SCH_HFC, 2), 135, cd + "SCH_HFC>1"},
-      {"Flush", field(&D::SCH_TD_FLUSH, 2), 167, cd + "SCH_TD_FLUSH>1"},
-      {"NullData", [](C& c, S&) { c.outputs.SCH_data_out = nullptr; }, 136,
+  const struct {
+    std::function<void(C&, S&)> change;
+    std::int32_t status;
+    std::string lines;
+    std::uint32_t buffer = 36864;
+  } cases[] = {
+      {[](C&, S& s) { s = nullptr; }, 101, kCalled + "null state structure"},
+      {[](C& c, S&) { c.outputs.SCH_data_out = nullptr; }, 136,
        kCalled + "null pointer for outputs->SCH_data_out"},
-      {"NullAck", [](C& c, S&) { c.outputs.SCH_ACK_out = nullptr; }, 137,
+      {[](C& c, S&) { c.outputs.SCH_ACK_out = nullptr; }, 137,
        kCalled + "null pointer for outputs->SCH_ACK_out"},
-      {"NullRi", [](C& c, S&) { c.outputs.SCH_RI_out = nullptr; }, 138,
+      {[](C& c, S&) { c.outputs.SCH_RI_out = nullptr; }, 138,
        kCalled + "null pointer for outputs->SCH_RI_out"},
-      {"NullSys", [](C& c, S&) { c.outputs.sys_harq_buffer = nullptr; }, 139,
+      {[](C& c, S&) { c.outputs.sys_harq_buffer = nullptr; }, 139,
        kCalled + "null pointer for outputs->sys_harq_buffer"},
-      {"NullP0", [](C& c, S&) { c.outputs.p0_harq_buffer = nullptr; }, 140,
+      {[](C& c, S&) { c.outputs.p0_harq_buffer = nullptr; }, 140,
        kCalled + "null pointer for outputs->p0_harq_buffer"},
-      {"NullP1", [](C& c, S&) { c.outputs.p1_harq_buffer = nullptr; }, 141,
+      {[](C& c, S&) { c.outputs.p1_harq_buffer = nullptr; }, 141,
        kCalled + "null pointer for outputs->p1_harq_buffer"},
-      {"NullCqiOut",
-       [](C& c, S&) {
+      {[](C& c, S&) {
          c.control.SCH_CQI_OP_SIZE = 1;
          c.control.SCH_CQI_IP_SIZE = 2;
          c.outputs.SCH_CQI_out = nullptr;
        },
        168, kCalled + "null pointer for outputs->SCH_CQI_out"},
-      {"NullCwOut", [](C& c, S&) { c.outputs.CW_CRC_out = nullptr; }, 169,
+      {[](C& c, S&) { c.outputs.CW_CRC_out = nullptr; }, 169,
        kCalled + "null pointer for outputs->CW_CRC_out"},
-      {"DataCapacity", [](C& c, S&) { c.outputs.max_SCH_data_out_size = 999; }, 142,
+      {[](C& c, S&) { c.outputs.max_SCH_data_out_size = 999; }, 142,
        kCalled + "outputs->max_SCH_data_out_size < inputs.controlData.SCH_TBSIZE"},
-      {"AckCapacity",
-       [](C& c, S&) {
-         c.control.SCH_ACK_OP_SIZE = 2;
-         c.control.SCH_ACK_IP_SIZE = 12;
-       },
-       143, kCalled + "outputs->max_SCH_ACK_out_size < inputs.controlData.SCH_ACK_OP_SIZE"},
-      {"RiCapacity",
-       [](C& c, S&) {
-         c.control.SCH_RI_OP_SIZE = 2;
-         c.control.SCH_RI_IP_SIZE = 12;
-       },
-       144, kCalled + "outputs->max_SCH_RI_out_size < inputs.controlData.SCH_RI_OP_SIZE"},
-      {"CqiCapacity",
-       [](C& c, S&) {
-         c.control.SCH_CQI_OP_SIZE = 2;
-         c.control.SCH_CQI_IP_SIZE = 32;
-       },
-       145, kCalled + "outputs->max_SCH_CQI_out_size < inputs.controlData.SCH_CQI_OP_SIZE"},
-      {"HarqCapacity", [](C& c, S&) { c.harqSize = 1029; }, 146,
+      {[](C& c, S&) { c.control.SCH_ACK_OP_SIZE = 2, c.control.SCH_ACK_IP_SIZE = 12; }, 143,
+       kCalled + "outputs->max_SCH_ACK_out_size < inputs.controlData.SCH_ACK_OP_SIZE"},
+      {[](C& c, S&) { c.control.SCH_RI_OP_SIZE = 2, c.control.SCH_RI_IP_SIZE = 12; }, 144,
+       kCalled + "outputs->max_SCH_RI_out_size < inputs.controlData.SCH_RI_OP_SIZE"},
+      {[](C& c, S&) { c.control.SCH_CQI_OP_SIZE = 2, c.control.SCH_CQI_IP_SIZE = 32; }, 145,
+       kCalled + "outputs->max_SCH_CQI_out_size < inputs.controlData.SCH_CQI_OP_SIZE"},
+      {[](C& c, S&) { c.harqSize = 1029; }, 146,
        kCalled + "outputs->max_harq_buffer_size < inputs.harq_buffer_size 1028 < 1029"},
-      {"NullLlr", [](C& c, S&) { c.llr.clear(); }, 147, kCalled + "null pointer for inputs.tb_llr"},
-      {"NullSysIn", [](C& c, S&) { c.control.SCH_ND = 0; }, 148,
+      {[](C& c, S&) { c.llr.clear(); }, 147, kCalled + "null pointer for inputs.tb_llr"},
+      {[&](C& c, S&) { retransmit(c, 1028), c.harqIn[0].clear(); }, 148,
        kCalled + "null pointer for inputs.sys_harq_buffer and not new data"},
-      {"NullP0In",
-       [](C& c, S&) {
-         c.control.SCH_ND = 0;
-         c.harqIn[0].assign(1028, 0);
-       },
-       149, kCalled + "null pointer for inputs.p0_harq_buffer and not new data"},
-      {"NullP1In",
-       [](C& c, S&) {
-         c.control.SCH_ND = 0;
-         c.harqIn[0].assign(1028, 0);
-         c.harqIn[1].assign(1028, 0);
-       },
-       150, kCalled + "null pointer for inputs.p1_harq_buffer and not new data"},
-      {"MatrixNormal", [](C& c, S&) { c.control.SCH_CH_INT_ROWS = 49; }, 151,
+      {[&](C& c, S&) { retransmit(c, 1028), c.harqIn[1].clear(); }, 149,
+       kCalled + "null pointer for inputs.p0_harq_buffer and not new data"},
+      {[&](C& c, S&) { retransmit(c, 1028), c.harqIn[2].clear(); }, 150,
+       kCalled + "null pointer for inputs.p1_harq_buffer and not new data"},
+      {[](C& c, S&) { c.control.SCH_CH_INT_ROWS = 49; }, 151,
        "ERROR:decoder:llr_size (1200) must be same size as "
        "inputs.controlData.SCH_CH_INT_ROWS*Columns*Qm (49 * 12)"},
-      {"MatrixExtended", [](C& c, S&) { c.control.SCH_CP = 1; }, 152,
+      {[](C& c, S&) { c.control.SCH_CP = 1; }, 152,
        "ERROR:decoder:llr_size (1200) must be same size as "
        "inputs.controlData.SCH_CH_INT_ROWS*Columns*Qm (50 * 10 * 2)"},
-      {"BufferSize",
-       [](C& c, S&) {
-         c.control.SCH_CH_INT_ROWS = 1537;  // 18444 symbols
-         c.llr.assign(2 * 1537 * 12, 0);
-       },
-       166, kCalled + "Input SCH block larger than input buffer size", 18432},
-      {"HarqCapacityForBlocks", [](C& c, S&) { c.outputs.max_harq_buffer_size = 1027; }, 153,
+      {[](C& c, S&) { c.control.SCH_CH_INT_ROWS = 1537, c.llr.assign(2 * 1537 * 12, 0); }, 166,
+       kCalled + "Input SCH block larger than input buffer size", 18432},
+      {[](C& c, S&) { c.outputs.max_harq_buffer_size = 1027; }, 153,
        "ERROR:decoder:outputs.max_harq_out_size is not correct based on ControlData fields "
        "1027 /= 1028"},
-      {"HarqSize",
-       [](C& c, S&) {
-         c.control.SCH_ND = 0;
-         c.harqSize = 1000;
-         for (auto& h : c.harqIn) h.assign(1000, 0);
-       },
-       154,
+      {[&](C& c, S&) { retransmit(c, 1000); }, 154,
        "ERROR:decoder:harq_buffer_size is not correct based on ControlData fields 1000 /= 1028"},
-      {"NoIterations",
-       [](C& c, S&) {
-         c.control.SCH_IP_DATA_TYPE = 0;
-         c.control.SCH_TD_ITER = 0;
-       },
-       157, "ERROR:decoder:Failed to setup Turbo Decoder Iterations "},
-      {"LlrNotG", [](C& c, S&) { c.control.SCH_RM_E_MINUS = 1100; }, 158,
+      {[](C& c, S&) { c.control.SCH_IP_DATA_TYPE = 0, c.control.SCH_TD_ITER = 0; }, 157,
+       "ERROR:decoder:Failed to setup Turbo Decoder Iterations "},
+      {[](C& c, S&) { c.control.SCH_RM_E_MINUS = 1100; }, 158,
        "ERROR:decoder:llr_size must be same size as g+CQI_Q+RI_Q : 1100 + 0 + 0 != 1200"},
-      {"AckParams",
-       [](C& c, S&) {
-         c.control.SCH_ACK_IP_SIZE = 3;  // not a whole number of QPSK symbols
-         c.control.SCH_ACK_OP_SIZE = 1;
-       },
-       200,
+      // Three ACK soft values are not a whole number of QPSK symbols.
+      {[](C& c, S&) { c.control.SCH_ACK_IP_SIZE = 3, c.control.SCH_ACK_OP_SIZE = 1; }, 200,
        "*../s/KLTE_PUSCH_Decoding(998)ACK Q must be a multiple of Qm\n"
        "File: ../s/brannoc_bitacc_cmodel.cpp(#)Error: Could not decode SCH"},
-      {"RetransmissionFails",
-       [](C& c, S&) {
-         c.control.SCH_ND = 0;
-         c.harqSize = 1028;
-         for (auto& h : c.harqIn) h.assign(1028, 0);
-         c.control.SCH_RI_IP_SIZE = 1;  // one soft value cannot be a QPSK symbol
-         c.control.SCH_RI_OP_SIZE = 1;
-         c.control.SCH_RM_E_MINUS = 1199;
-         c.control.SCH_RM_E_PLUS = 1199;
+      {[&](C& c, S&) {
+         retransmit(c, 1028);
+         c.control.SCH_RI_IP_SIZE = c.control.SCH_RI_OP_SIZE = 1;
+         c.control.SCH_RM_E_MINUS = c.control.SCH_RM_E_PLUS = 1199;
        },
        201,
        "*../s/KLTE_PUSCH_Decoding(1025)RI Q must be a multiple of Qm\n"
        "File: ../s/brannoc_bitacc_cmodel.cpp(#)Error: Could not decode SCH with HARQ"},
-      {"CodeBlockFlagsCapacity", [](C& c, S&) { c.outputs.max_CW_CRC_out_size = 0; }, 305,
+      {[](C& c, S&) { c.outputs.max_CW_CRC_out_size = 0; }, 305,
        "ERROR:decoder:Insufficient allocated space for CW CRC output array"},
   };
-}
-
-class SharedChannelStatus : public testing::TestWithParam<StatusCase> {};
-
-TEST_P(SharedChannelStatus, ReportsItsCodeAndLine) {
-  const StatusCase& c = GetParam();
-  vexlon_ip_brannoc_generics generics = vexlon_ip_brannoc_get_default_generics();
-  generics.C_INTERLEAVER_BUFFER_SIZE = c.interleaverBuffer;
-  Instance instance(generics);
-  SchCall call = validCall();
-  vexlon_ip_brannoc_state* state = instance.get();
-  c.change(call, state);
-  const vexlon_ip_brannoc_SCH_inputs inputs = call.inputs();
-  std::int32_t status = -1;
-  const std::string err = stderrOf(
-      [&] { status = vexlon_ip_brannoc_SCH_bitacc_simulate(state, inputs, &call.outputs); });
-  EXPECT_EQ(status, c.status);
-  if (c.status == 0) {
-    EXPECT_EQ(err, "");
-  } else if (c.line.front() == '*') {
-    expectLines(err, c.line + "\n");
-  } else {
-    expectLines(err, "File: ../s/brannoc_bitacc_cmodel.cpp(#)" + c.line + "\n");
-  }
-  EXPECT_EQ(call.outputs.SCH_TAG_out, 0u);
-  if (c.status < 300) {
-    EXPECT_EQ(call.data[0], 9) << "an output was written";
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.status);
+    expectStatus(c.change, c.status, c.lines, c.buffer);
   }
 }
-
-INSTANTIATE_TEST_SUITE_P(Codes, SharedChannelStatus, testing::ValuesIn(statusCases()),
-                         [](const testing::TestParamInfo<StatusCase>& info) {
-                           return std::string(info.param.name);
-                         });
 
 // Results written before a capacity failure stay written.
 TEST(SharedChannelOutputs, CodeBlockFlagCapacityFailureKeepsEarlierOutputs) {
