@@ -53,6 +53,10 @@ void* operator new(std::size_t n) {
   }
   throw std::bad_alloc();
 }
+void* operator new(std::size_t n, const std::nothrow_t&) noexcept {
+  return failHere(n) ? nullptr : std::malloc(n == 0 ? 1 : n);
+}
+
 // The replaced operator new takes its memory from malloc, so free releases it.
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wmismatched-new-delete"
