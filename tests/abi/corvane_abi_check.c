@@ -11,8 +11,11 @@ static void check_generics(void) {
   SIZE(vexlon_ip_corvane_generics, 76, 76);
   FIELD(vexlon_ip_corvane_generics, max_block_size, 0, 0);
   FIELD(vexlon_ip_corvane_generics, processing_units, 16, 16);
+  FIELD(vexlon_ip_corvane_generics, steps_per_unit, 20, 20);
+  FIELD(vexlon_ip_corvane_generics, decoder_path, 24, 24);
   FIELD(vexlon_ip_corvane_generics, algorithm, 28, 28);
   FIELD(vexlon_ip_corvane_generics, extrinsic_bits, 32, 32);
+  FIELD(vexlon_ip_corvane_generics, max_code_blocks, 36, 36);
   FIELD(vexlon_ip_corvane_generics, reserved_18, 72, 72);
 }
 
@@ -44,7 +47,9 @@ static void check_calls(void) {
   vexlon_ip_corvane_generics generics = vexlon_ip_corvane_get_default_generics();
   vexlon_ip_corvane_state *state;
   if (generics.processing_units != 2 || generics.algorithm != 1 ||
-      generics.max_block_size != 6144 || generics.extrinsic_bits != 10) {
+      generics.max_block_size != 6144 || generics.extrinsic_bits != 10 ||
+      generics.steps_per_unit != 32 || generics.decoder_path != 0 ||
+      generics.max_code_blocks != 1) {
     printf("default generics are wrong\n");
     ++abi_failures;
   }
@@ -56,6 +61,11 @@ static void check_calls(void) {
   generics.processing_units = 3;
   if (vexlon_ip_corvane_create_state(generics) != NULL) {
     printf("create_state accepted 3 processing units\n");
+    ++abi_failures;
+  }
+  if (vexlon_ip_corvane_bitacc_simulate_batch(NULL, NULL, 1, NULL) !=
+      VEXLON_IP_CORVANE_NULL_STATE) {
+    printf("simulate_batch accepted a null state\n");
     ++abi_failures;
   }
 }
