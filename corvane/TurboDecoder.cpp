@@ -9,10 +9,6 @@
 
 namespace corvane {
 
-Metric softValue(std::int32_t value) {
-  return static_cast<Metric>(std::clamp<std::int32_t>(value, -128, 127));
-}
-
 void tailBetas(const CodeBlock& block, StateMetrics (&betas)[2]) {
   // The tail of clause 5.1.3.2.2: x_K, z_K, x_K+1, z_K+1, x_K+2, z_K+2 of the first encoder
   // and the primed values of the second spread over d0, d1, d2 at K..K+3.

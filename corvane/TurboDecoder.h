@@ -46,7 +46,9 @@ struct CodeBlock {
 };
 
 // A received soft value saturated to the 8-bit range -128..127.
-Metric softValue(std::int32_t value);
+inline Metric softValue(std::int32_t value) {
+  return static_cast<Metric>(value < -128 ? -128 : (value > 127 ? 127 : value));
+}
 
 // beta_K of both constituent codes from the block's tail values (clause 5.1.3.2.2).
 void tailBetas(const CodeBlock& block, StateMetrics (&betas)[2]);

@@ -2,6 +2,8 @@
 // for every target by foreach_target.h, which includes this file once per target.
 #include "VectorDecoder.h"
 
+#include <algorithm>
+
 #if CORVANE_HAVE_HIGHWAY
 
 #undef HWY_TARGET_INCLUDE
@@ -149,42 +151,92 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_
   hn::Store(b7, d, betaStates + 7 * N);
 }
 
-// lu = systematic + the a priori values made of the gathered raw extrinsic values already
-// in lu: scaled by 0.75 (scaled max-log-MAP) and saturated to the extrinsic width. The raw
+// The a priori value of a raw extrinsic value: scaled by 0.75 for scaled max-log-MAP (the
+// product rounded as ScaledMaxLogPolicy does), saturated to the extrinsic width. The raw
 // value is first limited to +-2047, which changes no result (0.75 * 2047 exceeds every
 // extrinsic limit) and keeps 3e within 16 bits.
 template <class D>
-HWY_NOINLINE void addAPriori(D d, const VectorWorkspace& work, const std::int16_t* systematic,
-                             std::int16_t* lu, std::size_t count) {
-  const std::size_t N = hn::Lanes(d);
-  const auto limit = hn::Set(d, static_cast<std::int16_t>(work.extrinsicLimit));
-  const auto negativeLimit = hn::Neg(limit);
-  const auto bound = hn::Set(d, 2047);
-  const auto two = hn::Set(d, 2);
-  const bool scaled = work.algorithm == Algorithm::ScaledMaxLog;
-  for (std::size_t i = 0; i < count; i += N) {
-    auto e = hn::Load(d, lu + i);
+struct APriori {
+  using V = decltype(hn::Zero(D()));
+  V limit, negativeLimit, bound, negativeBound, two;
+  bool scaled;
+  explicit APriori(const VectorWorkspace& work) {
+    const D d;
+    limit = hn::Set(d, static_cast<std::int16_t>(work.extrinsicLimit));
+    negativeLimit = hn::Neg(limit);
+    bound = hn::Set(d, 2047);
+    negativeBound = hn::Neg(bound);
+    two = hn::Set(d, 2);
+    scaled = work.algorithm == Algorithm::ScaledMaxLog;
+  }
+  HWY_INLINE V operator()(V e) const {
+    const D d;
     if (scaled) {
-      e = hn::Min(hn::Max(e, hn::Neg(bound)), bound);
-      const auto triple = hn::Add(hn::Add(e, e), e);
+      e = hn::Min(hn::Max(e, negativeBound), bound);
+      const V triple = hn::Add(hn::Add(e, e), e);
       // (3e + 2 - [3e < 0]) >> 2: the mask of 3e < 0 is -1.
-      const auto rounded =
-          hn::Add(hn::Add(triple, two), hn::VecFromMask(d, hn::Lt(triple, hn::Zero(d))));
-      e = hn::ShiftRight<2>(rounded);
+      e = hn::ShiftRight<2>(
+          hn::Add(hn::Add(triple, two), hn::VecFromMask(d, hn::Lt(triple, hn::Zero(d)))));
     }
-    e = hn::Min(hn::Max(e, negativeLimit), limit);
-    hn::Store(hn::Add(hn::Load(d, systematic + i), e), d, lu + i);
+    return hn::Min(hn::Max(e, negativeLimit), limit);
+  }
+};
+
+// Carries values of one decoder's order into the other's: the value for step k of every
+// window comes from step source[k] of the same lane group, its lanes rearranged within each
+// block's windows by pattern[k] (16 byte indices, repeated in every 128-bit block: the P
+// windows of a block share one 128-bit block, P dividing 8). out = add + transform(moved).
+template <class D, class Transform>
+HWY_NOINLINE void permuteSteps(D d, const Transform& transform, const VectorWorkspace& work,
+                               int toDecoder, std::size_t laneGroups, std::size_t L,
+                               const std::int16_t* HWY_RESTRICT from,
+                               const std::int16_t* HWY_RESTRICT add,
+                               std::int16_t* HWY_RESTRICT out) {
+  const std::size_t N = hn::Lanes(d);
+  const hn::Repartition<std::uint8_t, D> bytes;
+  const std::uint16_t* source = work.sourceStep[toDecoder].get();
+  const std::uint8_t* pattern = work.lanePattern[toDecoder].get();
+  const bool permuted = work.processingUnits > 1;
+  for (std::size_t group = 0; group < laneGroups; ++group) {
+    const std::size_t first = group * L * N;
+    for (std::size_t k = 0; k < L; ++k) {
+      auto moved = hn::Load(d, from + first + source[k] * N);
+      if (permuted) {
+        moved = hn::TableLookupBytes(moved, hn::BitCast(d, hn::LoadDup128(bytes, pattern + 16 * k)));
+      }
+      const std::size_t at = first + k * N;
+      hn::Store(hn::Add(hn::Load(d, add + at), transform(moved)), d, out + at);
+    }
   }
 }
 
-// The group's layout: where step k of window w of block b lies.
-struct Layout {
-  std::size_t P, L, N;
-  std::size_t at(std::size_t b, std::size_t w, std::size_t k) const {
-    const std::size_t s = b * P + w;
-    return ((s / N) * L + k) * N + s % N;
+// The tables of permuteSteps for the group's K, from the QPP permutation: Pi(w*L + k) is
+// congruent to Pi(k) modulo L for every window w (Pi(x + L) - Pi(x) = L * (f1 + f2 * (2x + L))),
+// so the interleaved step k of every window reads one natural step, and back.
+void buildStepTables(VectorWorkspace& work, const QppRow& row) {
+  const std::size_t K = row.K;
+  const std::size_t P = work.processingUnits;
+  const std::size_t L = K / P;
+  std::uint16_t* pi = work.pi.get();
+  std::uint16_t* inverse = work.piInverse.get();
+  buildQppPermutation(row, pi);
+  for (std::size_t i = 0; i < K; ++i) inverse[pi[i]] = static_cast<std::uint16_t>(i);
+  const std::uint16_t* maps[2] = {inverse, pi};  // to decoder 0: natural <- interleaved
+  for (int decoder = 0; decoder < 2; ++decoder) {
+    const std::uint16_t* map = maps[decoder];
+    for (std::size_t k = 0; k < L; ++k) {
+      work.sourceStep[decoder].get()[k] = static_cast<std::uint16_t>(map[k] % L);
+      std::uint8_t* pattern = work.lanePattern[decoder].get() + 16 * k;
+      for (std::size_t lane = 0; lane < 8; ++lane) {
+        const std::size_t w = lane % P;
+        const std::size_t source = lane - w + map[w * L + k] / L;
+        pattern[2 * lane] = static_cast<std::uint8_t>(2 * source);
+        pattern[2 * lane + 1] = static_cast<std::uint8_t>(2 * source + 1);
+      }
+    }
   }
-};
+  work.tablesK = K;
+}
 
 template <class D>
 void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
@@ -194,41 +246,47 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
   const std::size_t N = hn::Lanes(d);
   const std::size_t S = count * P;
   const std::size_t laneGroups = (S + N - 1) / N;
-  const Layout layout{P, K / P, N};
-  const std::size_t L = layout.L;
+  const std::size_t L = K / P;
   const std::size_t positions = laneGroups * L * N;
   const std::uint32_t iterations = blocks[0]->iterations;
+  if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
 
-  std::uint16_t* pi = work.pi.get();
-  buildQppPermutation(*blocks[0]->row, pi);
+  const std::uint16_t* pi = work.pi.get();
   std::int16_t* sys[2] = {work.systematic[0].get(), work.systematic[1].get()};
   std::int16_t* par[2] = {work.parity[0].get(), work.parity[1].get()};
-  std::uint32_t* gather[2] = {work.gather[0].get(), work.gather[1].get()};
   std::int16_t* lu = work.lu.get();
   std::int16_t* extrinsic = work.extrinsic.get();
-  // Lanes without a segment decode zeros and gather from themselves.
-  for (std::size_t j = 0; j < positions; ++j) {
-    sys[0][j] = sys[1][j] = par[0][j] = par[1][j] = 0;
-    gather[0][j] = gather[1][j] = static_cast<std::uint32_t>(j);
-  }
-  for (std::size_t b = 0; b < count; ++b) {
-    const CodeBlock& block = *blocks[b];
-    for (std::size_t w = 0; w < P; ++w) {
+  // Every value of the group in array order: block b's window w is segment s = b*P + w, in
+  // lane s % N of lane group s / N; lanes without a segment hold zeros.
+  const auto forEachValue = [&](const auto& visit) {
+    for (std::size_t group = 0; group < laneGroups; ++group) {
+      const std::size_t firstBlock = group * (N / P);
+      const std::size_t groupBlocks = std::min(N / P, count - firstBlock);
       for (std::size_t k = 0; k < L; ++k) {
-        const std::size_t i = w * L + k;
-        const std::size_t j = layout.at(b, w, k);
-        sys[0][j] = softValue(block.d0[i]);
-        par[0][j] = softValue(block.d1[i]);
-        par[1][j] = softValue(block.d2[i]);
-        const std::size_t n = pi[i];
-        const std::size_t from = layout.at(b, n / L, n % L);
-        sys[1][j] = softValue(block.d0[n]);
-        gather[1][j] = static_cast<std::uint32_t>(from);
-        gather[0][from] = static_cast<std::uint32_t>(j);
+        const std::size_t first = (group * L + k) * N;
+        for (std::size_t b = 0; b < groupBlocks; ++b) {
+          const CodeBlock& block = *blocks[firstBlock + b];
+          for (std::size_t w = 0; w < P; ++w) visit(first + b * P + w, block, w * L + k);
+        }
       }
     }
+  };
+  if (S % N != 0) {
+    std::fill_n(sys[0], positions, std::int16_t{0});
+    std::fill_n(par[0], positions, std::int16_t{0});
+    std::fill_n(par[1], positions, std::int16_t{0});
+  }
+  forEachValue([&](std::size_t j, const CodeBlock& block, std::size_t i) {
+    sys[0][j] = softValue(block.d0[i]);
+    par[0][j] = softValue(block.d1[i]);
+    par[1][j] = softValue(block.d2[i]);
+  });
+  const auto unchanged = [](auto v) { return v; };
+  std::fill_n(lu, positions, std::int16_t{0});
+  permuteSteps(d, unchanged, work, 1, laneGroups, L, sys[0], lu, sys[1]);
+  for (std::size_t b = 0; b < count; ++b) {
     StateMetrics betas[2];
-    tailBetas(block, betas);
+    tailBetas(*blocks[b], betas);
     work.tails[2 * b] = betas[0];
     work.tails[2 * b + 1] = betas[1];
   }
@@ -275,18 +333,17 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
       }
     }
   };
-  const auto exchange = [&](int toDecoder) {
-    const std::uint32_t* from = gather[toDecoder];
-    for (std::size_t j = 0; j < positions; ++j) lu[j] = extrinsic[from[j]];
-    addAPriori(d, work, sys[toDecoder], lu, positions);
+  const APriori<D> aPriori(work);
+  const auto toDecoder = [&](int decoder) {
+    permuteSteps(d, aPriori, work, decoder, laneGroups, L, extrinsic, sys[decoder], lu);
   };
   const auto iterate = [&](const auto& combine) {
     for (std::size_t j = 0; j < positions; ++j) lu[j] = sys[0][j];
     for (std::uint32_t iteration = 0; iteration < iterations; ++iteration) {
       halfIteration(combine, 0);
-      exchange(1);
+      toDecoder(1);
       halfIteration(combine, 1);
-      if (iteration + 1 < iterations) exchange(0);
+      if (iteration + 1 < iterations) toDecoder(0);
     }
   };
   if (work.algorithm == Algorithm::LogMap) {
@@ -295,17 +352,17 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
     iterate(MaxCombine<D>{});
   }
   // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1.
-  for (std::size_t b = 0; b < count; ++b) {
-    std::uint8_t* bits = blocks[b]->bits;
-    for (std::size_t w = 0; w < P; ++w) {
-      for (std::size_t k = 0; k < L; ++k) {
-        const std::size_t j = layout.at(b, w, k);
-        bits[pi[w * L + k]] = static_cast<std::uint8_t>(lu[j] + extrinsic[j] >= 0 ? 1 : 0);
-      }
-    }
-  }
+  forEachValue([&](std::size_t j, const CodeBlock& block, std::size_t i) {
+    block.bits[pi[i]] = static_cast<std::uint8_t>(lu[j] + extrinsic[j] >= 0 ? 1 : 0);
+  });
 }
 
+#if HWY_TARGET == HWY_SCALAR
+// The one-lane fallback target (a processor without SSSE3) decodes with the scalar decoder.
+void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
+  for (std::size_t b = 0; b < count; ++b) work.oneLane.decode(*blocks[b]);
+}
+#else
 void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
   const std::size_t maxLanes = hn::Lanes(hn::ScalableTag<std::int16_t>());
   const std::size_t lanes = laneGroupWidth(count * work.processingUnits, maxLanes);
@@ -317,6 +374,7 @@ void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::siz
     decodeGroupWith(hn::CappedTag<std::int16_t, 32>(), work, blocks, count);
   }
 }
+#endif  // HWY_TARGET == HWY_SCALAR
 
 }  // namespace HWY_NAMESPACE
 }  // namespace corvane
@@ -352,12 +410,12 @@ bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& cor
   const std::size_t n = work.positions;
   bool ok = work.lu.allocate(n) && work.extrinsic.allocate(n) &&
             work.alpha.allocate(7 * groupLanes * L) && work.laneStates.allocate(16 * 32) &&
-            work.pi.allocate(K);
+            work.pi.allocate(K) && work.piInverse.allocate(K);
   for (int decoder = 0; decoder < 2; ++decoder) {
     ok = ok && work.systematic[decoder].allocate(n) && work.parity[decoder].allocate(n) &&
-         work.gather[decoder].allocate(n);
+         work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L);
   }
-  if (!ok) return false;
+  if (!ok || !work.oneLane.init(config)) return false;
   work.boundaries.reset(new (std::nothrow) StateMetrics[8 * work.maxSegments]);
   work.tails.reset(new (std::nothrow) StateMetrics[2 * B]);
   itsGroup.reset(new (std::nothrow) const CodeBlock*[B]);

@@ -73,15 +73,20 @@ struct VectorWorkspace {
   AlignedArray<std::int16_t> parity[2];
   AlignedArray<std::int16_t> lu;          // systematic + a priori
   AlignedArray<std::int16_t> extrinsic;   // raw extrinsic values
-  AlignedArray<std::uint32_t> gather[2];  // position of decoder d's a priori value in
-                                          // the other decoder's extrinsic array
+  // Per decoder d and step k: the step of the other decoder's order its values come from,
+  // and the 16 byte indices that move them between the lanes (see permuteSteps).
+  AlignedArray<std::uint16_t> sourceStep[2];
+  AlignedArray<std::uint8_t> lanePattern[2];
   AlignedArray<std::int16_t> alpha;       // forward metrics of one lane group
   AlignedArray<std::int16_t> laneStates;  // 2 x 8 x 32 boundary metrics of a lane group
   AlignedArray<std::uint16_t> pi;         // QPP permutation of the group's K
-  std::unique_ptr<StateMetrics[]>
-      boundaries;                         // [decoder][alpha, beta, new alpha, new beta][segment]
+  AlignedArray<std::uint16_t> piInverse;
+  std::size_t tablesK = 0;                // the K of pi, sourceStep and lanePattern
+  // [decoder][alpha, beta, new alpha, new beta][segment]
+  std::unique_ptr<StateMetrics[]> boundaries;
   std::unique_ptr<StateMetrics[]> tails;  // [block][decoder]
   std::size_t maxSegments = 0;
+  TurboDecoder oneLane;  // the decoder of Highway's one-lane fallback target
 };
 
 class VectorDecoder {
