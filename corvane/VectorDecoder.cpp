@@ -338,7 +338,7 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
     permuteSteps(d, aPriori, work, decoder, laneGroups, L, extrinsic, sys[decoder], lu);
   };
   const auto iterate = [&](const auto& combine) {
-    for (std::size_t j = 0; j < positions; ++j) lu[j] = sys[0][j];
+    std::copy_n(sys[0], positions, lu);
     for (std::uint32_t iteration = 0; iteration < iterations; ++iteration) {
       halfIteration(combine, 0);
       toDecoder(1);
