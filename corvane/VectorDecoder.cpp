@@ -17,22 +17,29 @@ namespace HWY_NAMESPACE {
 
 namespace hn = hwy::HWY_NAMESPACE;
 
+#if HWY_TARGET == HWY_SCALAR
+// The one-lane fallback target (a processor without SSSE3) decodes with the scalar decoder.
+void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
+  for (std::size_t b = 0; b < count; ++b) work.oneLane.decode(*blocks[b]);
+}
+#else
+
 // max for max-log-MAP.
-template <class D>
 struct MaxCombine {
-  using V = decltype(hn::Zero(D()));
-  HWY_INLINE V operator()(V a, V b) const { return hn::Max(a, b); }
+  template <class V>
+  HWY_INLINE V operator()(V a, V b) const {
+    return hn::Max(a, b);
+  }
 };
 
 // max* for log-MAP: max(a, b) plus the correction of |a - b|, counted as the thresholds
 // above the difference (the table falls monotonically, so this is the table's entry).
-template <class D>
 struct LogMapCombine {
-  using V = decltype(hn::Zero(D()));
   const std::int16_t* threshold;
   int count;
+  template <class V>
   HWY_INLINE V operator()(V a, V b) const {
-    const D d;
+    const hn::DFromV<V> d;
     const V larger = hn::Max(a, b);
     const V difference = hn::SaturatedSub(larger, hn::Min(a, b));
     V below = hn::Zero(d);
@@ -43,11 +50,58 @@ struct LogMapCombine {
   }
 };
 
-// One lane group of one half-iteration: the forward recursion from the alpha metrics in
-// states[0..7] (one vector per state, lanes = segments) over `length` steps, storing every
-// alpha, then the backward recursion from the beta metrics in states[8..15] with the raw
-// extrinsic value of every step. Leaves the reached alpha and beta in states. State 0 is 0
-// throughout (every metric is stored relative to it), so it takes no register.
+// The backward recursion runs in the forward recursion's form on relabelled states:
+// register i holds beta of state sigma(i), sigma reversing the three state bits. Then
+// beta_k's butterflies (0, 1) <- (0, 4), (2, 3) <- (1, 5), (4, 5) <- (2, 6), (6, 7) <- (3, 7)
+// become the forward butterflies 0 <- (0, 1), 2 <- (4, 5), 1 <- (2, 3), 3 <- (6, 7) with the
+// branch metrics Lu and Lp exchanged, and state 0 stays register 0.
+constexpr int kSigma[kStates] = {0, 4, 2, 6, 1, 5, 3, 7};
+
+// One step of the forward recursion (forwardStep) on the metrics of states 1..7 in m[1..7]
+// (state 0's is 0 before and after: every metric is kept relative to it), with Lu = g and
+// Lp = p; one step of the backward recursion on relabelled metrics with Lu = p and Lp = g.
+template <class Combine, class V>
+HWY_INLINE void trellisStep(const Combine& combine, V (&m)[kStates], V zero, V g, V p) {
+  const V both = hn::Add(g, p);
+  const V n0 = combine(zero, hn::Add(m[1], both));
+  const V n4 = combine(both, m[1]);
+  const V n1 = combine(hn::Add(m[2], g), hn::Add(m[3], p));
+  const V n5 = combine(hn::Add(m[2], p), hn::Add(m[3], g));
+  const V n2 = combine(hn::Add(m[4], p), hn::Add(m[5], g));
+  const V n6 = combine(hn::Add(m[4], g), hn::Add(m[5], p));
+  const V n3 = combine(hn::Add(m[6], both), m[7]);
+  const V n7 = combine(m[6], hn::Add(m[7], both));
+  m[1] = hn::Sub(n1, n0);
+  m[2] = hn::Sub(n2, n0);
+  m[3] = hn::Sub(n3, n0);
+  m[4] = hn::Sub(n4, n0);
+  m[5] = hn::Sub(n5, n0);
+  m[6] = hn::Sub(n6, n0);
+  m[7] = hn::Sub(n7, n0);
+}
+
+// extrinsicStep from alpha_k (a[1..7]) and relabelled beta_k+1 (r[1..7]), alpha_0 = beta_0 = 0.
+template <class D, class Combine, class V>
+HWY_INLINE V extrinsicOf(D d, const Combine& combine, const V (&a)[kStates], const V (&r)[kStates],
+                         V zero, V p) {
+  const V b1 = r[4], b2 = r[2], b3 = r[6], b4 = r[1], b5 = r[5], b6 = r[3], b7 = r[7];
+  const V oneParity0 = combine(combine(hn::Add(a[2], b1), hn::Add(a[3], b5)),
+                               combine(hn::Add(a[4], b6), hn::Add(a[5], b2)));
+  const V oneParity1 = combine(combine(b4, a[1]), combine(hn::Add(a[6], b3), hn::Add(a[7], b7)));
+  const V zeroParity0 =
+      combine(combine(zero, hn::Add(a[1], b4)), combine(hn::Add(a[6], b7), hn::Add(a[7], b3)));
+  const V zeroParity1 = combine(combine(hn::Add(a[2], b5), hn::Add(a[3], b1)),
+                                combine(hn::Add(a[4], b2), hn::Add(a[5], b6)));
+  const V e = hn::SaturatedSub(combine(oneParity0, hn::Add(oneParity1, p)),
+                               combine(zeroParity0, hn::Add(zeroParity1, p)));
+  return hn::Max(e, hn::Set(d, -32767));
+}
+
+// One lane group of one half-iteration, lanes = segments: the forward recursion from the
+// alpha metrics in states[0..7] (one row of lanes per state) over `length` steps, storing
+// every alpha, then the backward recursion from the relabelled beta metrics in
+// states[8..15] with the raw extrinsic value of every step. Leaves the reached alpha and
+// (relabelled) beta in states.
 template <class D, class Combine>
 HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_t* HWY_RESTRICT lu,
                                   const std::int16_t* HWY_RESTRICT lp, std::size_t length,
@@ -57,98 +111,75 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_
   using V = decltype(hn::Zero(d));
   const std::size_t N = hn::Lanes(d);
   const V zero = hn::Zero(d);
-  V a1 = hn::Load(d, states + 1 * N), a2 = hn::Load(d, states + 2 * N);
-  V a3 = hn::Load(d, states + 3 * N), a4 = hn::Load(d, states + 4 * N);
-  V a5 = hn::Load(d, states + 5 * N), a6 = hn::Load(d, states + 6 * N);
-  V a7 = hn::Load(d, states + 7 * N);
+  V a[kStates], r[kStates];
+  for (int m = 1; m < kStates; ++m) a[m] = hn::Load(d, states + m * N);
   for (std::size_t k = 0; k < length; ++k) {
     std::int16_t* store = alphaStore + k * 7 * N;
-    hn::Store(a1, d, store + 0 * N);
-    hn::Store(a2, d, store + 1 * N);
-    hn::Store(a3, d, store + 2 * N);
-    hn::Store(a4, d, store + 3 * N);
-    hn::Store(a5, d, store + 4 * N);
-    hn::Store(a6, d, store + 5 * N);
-    hn::Store(a7, d, store + 6 * N);
-    const V g = hn::Load(d, lu + k * N);
-    const V p = hn::Load(d, lp + k * N);
-    const V both = hn::Add(g, p);
-    // The butterflies of forwardStep: 0 <- (0, 1), 1 <- (2, 3), 2 <- (4, 5), 3 <- (6, 7).
-    const V n0 = combine(zero, hn::Add(a1, both));
-    const V n4 = combine(both, a1);
-    const V n1 = combine(hn::Add(a2, g), hn::Add(a3, p));
-    const V n5 = combine(hn::Add(a2, p), hn::Add(a3, g));
-    const V n2 = combine(hn::Add(a4, p), hn::Add(a5, g));
-    const V n6 = combine(hn::Add(a4, g), hn::Add(a5, p));
-    const V n3 = combine(hn::Add(a6, both), a7);
-    const V n7 = combine(a6, hn::Add(a7, both));
-    a1 = hn::Sub(n1, n0);
-    a2 = hn::Sub(n2, n0);
-    a3 = hn::Sub(n3, n0);
-    a4 = hn::Sub(n4, n0);
-    a5 = hn::Sub(n5, n0);
-    a6 = hn::Sub(n6, n0);
-    a7 = hn::Sub(n7, n0);
+    for (int m = 1; m < kStates; ++m) hn::Store(a[m], d, store + (m - 1) * N);
+    trellisStep(combine, a, zero, hn::Load(d, lu + k * N), hn::Load(d, lp + k * N));
   }
-  hn::Store(a1, d, states + 1 * N);
-  hn::Store(a2, d, states + 2 * N);
-  hn::Store(a3, d, states + 3 * N);
-  hn::Store(a4, d, states + 4 * N);
-  hn::Store(a5, d, states + 5 * N);
-  hn::Store(a6, d, states + 6 * N);
-  hn::Store(a7, d, states + 7 * N);
-
-  std::int16_t* betaStates = states + 8 * N;
-  V b1 = hn::Load(d, betaStates + 1 * N), b2 = hn::Load(d, betaStates + 2 * N);
-  V b3 = hn::Load(d, betaStates + 3 * N), b4 = hn::Load(d, betaStates + 4 * N);
-  V b5 = hn::Load(d, betaStates + 5 * N), b6 = hn::Load(d, betaStates + 6 * N);
-  V b7 = hn::Load(d, betaStates + 7 * N);
-  const V floor = hn::Set(d, -32767);
+  for (int m = 1; m < kStates; ++m) hn::Store(a[m], d, states + m * N);
+  for (int m = 1; m < kStates; ++m) r[m] = hn::Load(d, states + (8 + m) * N);
   for (std::size_t k = length; k-- > 0;) {
     const std::int16_t* store = alphaStore + k * 7 * N;
-    const V al1 = hn::Load(d, store + 0 * N), al2 = hn::Load(d, store + 1 * N);
-    const V al3 = hn::Load(d, store + 2 * N), al4 = hn::Load(d, store + 3 * N);
-    const V al5 = hn::Load(d, store + 4 * N), al6 = hn::Load(d, store + 5 * N);
-    const V al7 = hn::Load(d, store + 6 * N);
+    for (int m = 1; m < kStates; ++m) a[m] = hn::Load(d, store + (m - 1) * N);
     const V g = hn::Load(d, lu + k * N);
     const V p = hn::Load(d, lp + k * N);
-    // extrinsicStep, with alpha_0 = beta_0 = 0.
-    const V oneParity0 = combine(combine(hn::Add(al2, b1), hn::Add(al3, b5)),
-                                 combine(hn::Add(al4, b6), hn::Add(al5, b2)));
-    const V oneParity1 = combine(combine(b4, al1), combine(hn::Add(al6, b3), hn::Add(al7, b7)));
-    const V zeroParity0 =
-        combine(combine(zero, hn::Add(al1, b4)), combine(hn::Add(al6, b7), hn::Add(al7, b3)));
-    const V zeroParity1 = combine(combine(hn::Add(al2, b5), hn::Add(al3, b1)),
-                                  combine(hn::Add(al4, b2), hn::Add(al5, b6)));
-    const V e = hn::SaturatedSub(combine(oneParity0, hn::Add(oneParity1, p)),
-                                 combine(zeroParity0, hn::Add(zeroParity1, p)));
-    hn::Store(hn::Max(e, floor), d, extrinsic + k * N);
-    // The butterflies of backwardStep: (0, 1) <- (0, 4), (2, 3) <- (1, 5), (4, 5) <- (2, 6),
-    // (6, 7) <- (3, 7).
-    const V both = hn::Add(g, p);
-    const V p0 = combine(zero, hn::Add(b4, both));
-    const V p1 = combine(both, b4);
-    const V p2 = combine(hn::Add(b1, g), hn::Add(b5, p));
-    const V p3 = combine(hn::Add(b1, p), hn::Add(b5, g));
-    const V p4 = combine(hn::Add(b2, p), hn::Add(b6, g));
-    const V p5 = combine(hn::Add(b2, g), hn::Add(b6, p));
-    const V p6 = combine(hn::Add(b3, both), b7);
-    const V p7 = combine(b3, hn::Add(b7, both));
-    b1 = hn::Sub(p1, p0);
-    b2 = hn::Sub(p2, p0);
-    b3 = hn::Sub(p3, p0);
-    b4 = hn::Sub(p4, p0);
-    b5 = hn::Sub(p5, p0);
-    b6 = hn::Sub(p6, p0);
-    b7 = hn::Sub(p7, p0);
+    hn::Store(extrinsicOf(d, combine, a, r, zero, p), d, extrinsic + k * N);
+    trellisStep(combine, r, zero, p, g);
   }
-  hn::Store(b1, d, betaStates + 1 * N);
-  hn::Store(b2, d, betaStates + 2 * N);
-  hn::Store(b3, d, betaStates + 3 * N);
-  hn::Store(b4, d, betaStates + 4 * N);
-  hn::Store(b5, d, betaStates + 5 * N);
-  hn::Store(b6, d, betaStates + 6 * N);
-  hn::Store(b7, d, betaStates + 7 * N);
+  for (int m = 1; m < kStates; ++m) hn::Store(r[m], d, states + (8 + m) * N);
+}
+
+// The same for a lane group of at most half a vector: the forward recursion in the lower
+// half and the backward recursion in the upper half of every register advance together
+// (step t takes alpha_t to alpha_t+1 and beta_L-t to beta_L-t-1, storing both), then every
+// step's extrinsic value is formed from the stored metrics, steps k and L-1-k side by side.
+template <class D, class Combine>
+HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
+                                        const std::int16_t* HWY_RESTRICT lu,
+                                        const std::int16_t* HWY_RESTRICT lp, std::size_t length,
+                                        std::int16_t* HWY_RESTRICT store,
+                                        std::int16_t* HWY_RESTRICT states,
+                                        std::int16_t* HWY_RESTRICT extrinsic) {
+  using V = decltype(hn::Zero(d));
+  const hn::Half<D> dh;
+  const std::size_t N = hn::Lanes(dh);
+  const std::size_t last = length - 1;
+  const V zero = hn::Zero(d);
+  V m[kStates];
+  for (int i = 1; i < kStates; ++i) {
+    m[i] = hn::Combine(d, hn::Load(dh, states + (8 + i) * N), hn::Load(dh, states + i * N));
+  }
+  for (std::size_t t = 0; t < length; ++t) {
+    std::int16_t* row = store + t * 7 * 2 * N;
+    for (int i = 1; i < kStates; ++i) hn::Store(m[i], d, row + (i - 1) * 2 * N);
+    const V g = hn::Combine(d, hn::Load(dh, lp + (last - t) * N), hn::Load(dh, lu + t * N));
+    const V p = hn::Combine(d, hn::Load(dh, lu + (last - t) * N), hn::Load(dh, lp + t * N));
+    trellisStep(combine, m, zero, g, p);
+  }
+  for (int i = 1; i < kStates; ++i) {
+    hn::Store(hn::LowerHalf(dh, m[i]), dh, states + i * N);
+    hn::Store(hn::UpperHalf(dh, m[i]), dh, states + (8 + i) * N);
+  }
+  // Row t holds alpha_t below and beta_L-t above: steps k and k2 = L-1-k read alpha from
+  // rows k and k2, and beta_k+1 and beta_k2+1 from rows k2 and k.
+  for (std::size_t k = 0; k <= last - k; ++k) {
+    const std::size_t k2 = last - k;
+    const std::int16_t* rowK = store + k * 7 * 2 * N;
+    const std::int16_t* rowK2 = store + k2 * 7 * 2 * N;
+    V a[kStates], r[kStates];
+    for (int i = 1; i < kStates; ++i) {
+      const V fromK = hn::Load(d, rowK + (i - 1) * 2 * N);
+      const V fromK2 = hn::Load(d, rowK2 + (i - 1) * 2 * N);
+      a[i] = hn::ConcatLowerLower(d, fromK2, fromK);
+      r[i] = hn::ConcatUpperUpper(d, fromK, fromK2);
+    }
+    const V p = hn::Combine(d, hn::Load(dh, lp + k2 * N), hn::Load(dh, lp + k * N));
+    const V e = extrinsicOf(d, combine, a, r, zero, p);
+    hn::Store(hn::UpperHalf(dh, e), dh, extrinsic + k2 * N);
+    hn::Store(hn::LowerHalf(dh, e), dh, extrinsic + k * N);
+  }
 }
 
 // The a priori value of a raw extrinsic value: scaled by 0.75 for scaled max-log-MAP (the
@@ -202,12 +233,30 @@ HWY_NOINLINE void permuteSteps(D d, const Transform& transform, const VectorWork
     for (std::size_t k = 0; k < L; ++k) {
       auto moved = hn::Load(d, from + first + source[k] * N);
       if (permuted) {
-        moved = hn::TableLookupBytes(moved, hn::BitCast(d, hn::LoadDup128(bytes, pattern + 16 * k)));
+        moved =
+            hn::TableLookupBytes(moved, hn::BitCast(d, hn::LoadDup128(bytes, pattern + 16 * k)));
       }
       const std::size_t at = first + k * N;
       hn::Store(hn::Add(hn::Load(d, add + at), transform(moved)), d, out + at);
     }
   }
+}
+
+// out[i] = in[i] saturated to -128..127, the received soft values' range.
+template <class D>
+HWY_NOINLINE void saturateSoftValues(D /* d */, const std::int32_t* in, std::int16_t* out,
+                                     std::size_t count) {
+  const hn::Repartition<std::int32_t, D> d32;
+  const hn::Rebind<std::int16_t, decltype(d32)> d16;
+  const std::size_t M = hn::Lanes(d32);
+  const auto low = hn::Set(d16, -128);
+  const auto high = hn::Set(d16, 127);
+  std::size_t i = 0;
+  for (; i + M <= count; i += M) {
+    hn::StoreU(hn::Min(hn::Max(hn::DemoteTo(d16, hn::LoadU(d32, in + i)), low), high), d16,
+               out + i);
+  }
+  for (; i < count; ++i) out[i] = softValue(in[i]);
 }
 
 // The tables of permuteSteps for the group's K, from the QPP permutation: Pi(w*L + k) is
@@ -238,8 +287,10 @@ void buildStepTables(VectorWorkspace& work, const QppRow& row) {
   work.tablesK = K;
 }
 
-template <class D>
-void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
+// Decodes a group in lane groups of d's width; a group that fills at most half of dPaired's
+// lanes runs the paired recursions in dPaired's registers.
+template <class D, class DPaired>
+void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBlock* const* blocks,
                      std::size_t count) {
   const std::size_t K = blocks[0]->row->K;
   const std::size_t P = work.processingUnits;
@@ -249,6 +300,7 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
   const std::size_t L = K / P;
   const std::size_t positions = laneGroups * L * N;
   const std::uint32_t iterations = blocks[0]->iterations;
+  const bool paired = laneGroups == 1 && hn::Lanes(dPaired) == 2 * N;
   if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
 
   const std::uint16_t* pi = work.pi.get();
@@ -256,19 +308,13 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
   std::int16_t* par[2] = {work.parity[0].get(), work.parity[1].get()};
   std::int16_t* lu = work.lu.get();
   std::int16_t* extrinsic = work.extrinsic.get();
-  // Every value of the group in array order: block b's window w is segment s = b*P + w, in
-  // lane s % N of lane group s / N; lanes without a segment hold zeros.
-  const auto forEachValue = [&](const auto& visit) {
-    for (std::size_t group = 0; group < laneGroups; ++group) {
-      const std::size_t firstBlock = group * (N / P);
-      const std::size_t groupBlocks = std::min(N / P, count - firstBlock);
-      for (std::size_t k = 0; k < L; ++k) {
-        const std::size_t first = (group * L + k) * N;
-        for (std::size_t b = 0; b < groupBlocks; ++b) {
-          const CodeBlock& block = *blocks[firstBlock + b];
-          for (std::size_t w = 0; w < P; ++w) visit(first + b * P + w, block, w * L + k);
-        }
-      }
+  // Every value of block b: its window w is segment s = b*P + w, in lane s % N of lane group
+  // s / N; lanes without a segment hold zeros.
+  const auto forEachValue = [&](std::size_t b, const auto& visit) {
+    for (std::size_t w = 0; w < P; ++w) {
+      const std::size_t s = b * P + w;
+      const std::size_t first = (s / N) * L * N + s % N;
+      for (std::size_t k = 0; k < L; ++k) visit(first + k * N, w * L + k);
     }
   };
   if (S % N != 0) {
@@ -276,11 +322,18 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
     std::fill_n(par[0], positions, std::int16_t{0});
     std::fill_n(par[1], positions, std::int16_t{0});
   }
-  forEachValue([&](std::size_t j, const CodeBlock& block, std::size_t i) {
-    sys[0][j] = softValue(block.d0[i]);
-    par[0][j] = softValue(block.d1[i]);
-    par[1][j] = softValue(block.d2[i]);
-  });
+  std::int16_t* received[3] = {work.received.get(), work.received.get() + K,
+                               work.received.get() + 2 * K};
+  for (std::size_t b = 0; b < count; ++b) {
+    saturateSoftValues(d, blocks[b]->d0, received[0], K);
+    saturateSoftValues(d, blocks[b]->d1, received[1], K);
+    saturateSoftValues(d, blocks[b]->d2, received[2], K);
+    forEachValue(b, [&](std::size_t j, std::size_t i) {
+      sys[0][j] = received[0][i];
+      par[0][j] = received[1][i];
+      par[1][j] = received[2][i];
+    });
+  }
   const auto unchanged = [](auto v) { return v; };
   std::fill_n(lu, positions, std::int16_t{0});
   permuteSteps(d, unchanged, work, 1, laneGroups, L, sys[0], lu, sys[1]);
@@ -312,17 +365,22 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
             !used ? zero : (w == P - 1 ? work.tails[2 * (s / P) + decoder] : betaIn[s + 1]);
         for (int m = 0; m < kStates; ++m) {
           states[m * N + lane] = a.m[m];
-          states[(8 + m) * N + lane] = bt.m[m];
+          states[(8 + m) * N + lane] = bt.m[kSigma[m]];
         }
       }
       const std::size_t first = group * L * N;
-      decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, work.alpha.get(), states,
-                      extrinsic + first);
+      if (paired) {
+        decodeLaneGroupPaired(dPaired, combine, lu, par[decoder], L, work.alpha.get(), states,
+                              extrinsic);
+      } else {
+        decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, work.alpha.get(), states,
+                        extrinsic + first);
+      }
       for (std::size_t lane = 0; lane < N && group * N + lane < S; ++lane) {
         const std::size_t s = group * N + lane;
         for (int m = 0; m < kStates; ++m) {
           alphaOut[s + 1].m[m] = states[m * N + lane];
-          betaOut[s].m[m] = states[(8 + m) * N + lane];
+          betaOut[s].m[kSigma[m]] = states[(8 + m) * N + lane];
         }
       }
     }
@@ -347,31 +405,36 @@ void decodeGroupWith(D d, VectorWorkspace& work, const CodeBlock* const* blocks,
     }
   };
   if (work.algorithm == Algorithm::LogMap) {
-    iterate(LogMapCombine<D>{work.threshold, work.thresholdCount});
+    iterate(LogMapCombine{work.threshold, work.thresholdCount});
   } else {
-    iterate(MaxCombine<D>{});
+    iterate(MaxCombine{});
   }
-  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1.
-  forEachValue([&](std::size_t j, const CodeBlock& block, std::size_t i) {
-    block.bits[pi[i]] = static_cast<std::uint8_t>(lu[j] + extrinsic[j] >= 0 ? 1 : 0);
-  });
+  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1
+  // (the saturated sum keeps the sign). lu takes the decisions, as masks of a negative sum.
+  for (std::size_t j = 0; j < positions; j += N) {
+    const auto sum = hn::SaturatedAdd(hn::Load(d, lu + j), hn::Load(d, extrinsic + j));
+    hn::Store(hn::VecFromMask(d, hn::Lt(sum, hn::Zero(d))), d, lu + j);
+  }
+  for (std::size_t b = 0; b < count; ++b) {
+    std::uint8_t* bits = blocks[b]->bits;
+    forEachValue(b, [&](std::size_t j, std::size_t i) {
+      bits[pi[i]] = static_cast<std::uint8_t>(lu[j] == 0 ? 1 : 0);
+    });
+  }
 }
 
-#if HWY_TARGET == HWY_SCALAR
-// The one-lane fallback target (a processor without SSSE3) decodes with the scalar decoder.
-void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
-  for (std::size_t b = 0; b < count; ++b) work.oneLane.decode(*blocks[b]);
-}
-#else
 void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
   const std::size_t maxLanes = hn::Lanes(hn::ScalableTag<std::int16_t>());
   const std::size_t lanes = laneGroupWidth(count * work.processingUnits, maxLanes);
   if (lanes <= 8) {
-    decodeGroupWith(hn::CappedTag<std::int16_t, 8>(), work, blocks, count);
+    decodeGroupWith(hn::CappedTag<std::int16_t, 8>(), hn::CappedTag<std::int16_t, 16>(), work,
+                    blocks, count);
   } else if (lanes <= 16) {
-    decodeGroupWith(hn::CappedTag<std::int16_t, 16>(), work, blocks, count);
+    decodeGroupWith(hn::CappedTag<std::int16_t, 16>(), hn::CappedTag<std::int16_t, 32>(), work,
+                    blocks, count);
   } else {
-    decodeGroupWith(hn::CappedTag<std::int16_t, 32>(), work, blocks, count);
+    const hn::CappedTag<std::int16_t, 32> d;
+    decodeGroupWith(d, d, work, blocks, count);
   }
 }
 #endif  // HWY_TARGET == HWY_SCALAR
@@ -406,11 +469,12 @@ bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& cor
   // laneGroupWidth); one lane group at most 32 lanes.
   const std::size_t L = K / P;
   work.positions = (B * P * 2 > 8 ? B * P * 2 : 8) * L;
-  const std::size_t groupLanes = B * P * 2 > 32 ? 32 : (B * P * 2 > 8 ? B * P * 2 : 8);
+  // One lane group (alpha, or alpha and beta in the paired recursions) at most 32 lanes.
+  const std::size_t groupLanes = std::min<std::size_t>(32, std::max<std::size_t>(16, 4 * B * P));
   const std::size_t n = work.positions;
   bool ok = work.lu.allocate(n) && work.extrinsic.allocate(n) &&
             work.alpha.allocate(7 * groupLanes * L) && work.laneStates.allocate(16 * 32) &&
-            work.pi.allocate(K) && work.piInverse.allocate(K);
+            work.pi.allocate(K) && work.piInverse.allocate(K) && work.received.allocate(3 * K);
   for (int decoder = 0; decoder < 2; ++decoder) {
     ok = ok && work.systematic[decoder].allocate(n) && work.parity[decoder].allocate(n) &&
          work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L);

@@ -10,12 +10,19 @@
 // sits in lane s % N of lane group s / N, N lanes wide (8, 16 or 32, the narrowest that
 // holds every segment, at most the processor's vector width); the values of step k of a
 // lane group lie at (group * L + k) * N + lane, so every step loads one vector. Between the
-// half-iterations the interleaver and this transposition are one precomputed gather.
+// half-iterations the QPP interleaver moves whole steps: interleaved step k of every window
+// reads one natural step, its lanes shuffled within each block (see buildStepTables).
 //
-// The vector code is compiled for every x86 instruction set Highway knows (SSE4, AVX2,
-// AVX-512 and a portable baseline) and the best the processor runs is chosen at the first
-// call. A build without Highway (CORVANE_SIMD off, Highway missing, or the 32-bit build)
-// has no vectorised decoder: vectorDecoderAvailable() is false and init() refuses.
+// A group that fills at most half of the widest vector (one block with 8 windows on AVX2,
+// up to 16 windows on AVX-512) runs the forward recursion in the lower half and the
+// backward recursion in the upper half of the same registers, then forms the extrinsic
+// values of two steps per vector, so the lanes are used twice as well.
+//
+// The vector code is compiled for every x86 instruction set Highway knows (SSSE3, SSE4, AVX2,
+// AVX-512) and the best the processor runs is chosen at the first call; on a processor
+// without SSSE3, Highway's one-lane fallback decodes with the scalar decoder. A build without
+// Highway (CORVANE_SIMD off, Highway missing, or the 32-bit build) has no vectorised decoder:
+// vectorDecoderAvailable() is false and init() refuses.
 #ifndef CORVANE_VECTORDECODER_H
 #define CORVANE_VECTORDECODER_H
 
@@ -71,8 +78,8 @@ struct VectorWorkspace {
   std::size_t positions = 0;                 // capacity of the per-position arrays
   AlignedArray<std::int16_t> systematic[2];  // per decoder: natural, interleaved order
   AlignedArray<std::int16_t> parity[2];
-  AlignedArray<std::int16_t> lu;          // systematic + a priori
-  AlignedArray<std::int16_t> extrinsic;   // raw extrinsic values
+  AlignedArray<std::int16_t> lu;         // systematic + a priori
+  AlignedArray<std::int16_t> extrinsic;  // raw extrinsic values
   // Per decoder d and step k: the step of the other decoder's order its values come from,
   // and the 16 byte indices that move them between the lanes (see permuteSteps).
   AlignedArray<std::uint16_t> sourceStep[2];
@@ -81,7 +88,8 @@ struct VectorWorkspace {
   AlignedArray<std::int16_t> laneStates;  // 2 x 8 x 32 boundary metrics of a lane group
   AlignedArray<std::uint16_t> pi;         // QPP permutation of the group's K
   AlignedArray<std::uint16_t> piInverse;
-  std::size_t tablesK = 0;                // the K of pi, sourceStep and lanePattern
+  AlignedArray<std::int16_t> received;  // d0, d1, d2 of one block, saturated
+  std::size_t tablesK = 0;              // the K of pi, sourceStep and lanePattern
   // [decoder][alpha, beta, new alpha, new beta][segment]
   std::unique_ptr<StateMetrics[]> boundaries;
   std::unique_ptr<StateMetrics[]> tails;  // [block][decoder]

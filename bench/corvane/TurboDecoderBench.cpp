@@ -67,8 +67,8 @@ void decodeBench(benchmark::State& state, std::int64_t target) {
   for (std::uint32_t b = 0; b < count; ++b) streams.push_back(noisyBlock(K, b));
   for (std::uint32_t b = 0; b < count; ++b) {
     const Streams& s = streams[b];
-    in.push_back({K, iterations, 1, 0, s.d0.data(), K + 4, s.d1.data(), K + 4, s.d2.data(),
-                  K + 4, 0, 0});
+    in.push_back(
+        {K, iterations, 1, 0, s.d0.data(), K + 4, s.d1.data(), K + 4, s.d2.data(), K + 4, 0, 0});
     out.push_back({0, 0, bits[b].data(), K});
   }
   for (auto _ : state) {

@@ -16,7 +16,9 @@
 //
 // Each frame draws its bits and its noise from seeds derived from the frame number, so a
 // frame is the same whichever thread decodes it. A point stops once it has the requested
-// number of frame errors or the frame cap; frames in flight then are still counted.
+// number of frame errors or the frame cap, and counts the frames in order up to that point, so
+// that its row does not depend on the threads or the batch size.
+#include <algorithm>
 #include <atomic>
 #include <cmath>
 #include <cstdint>
@@ -107,7 +109,7 @@ bool parse(int argc, char** argv, Options& o) {
   }
   if (o.steps == 0) o.steps = static_cast<std::uint32_t>(std::lround(o.scale));
   return argc % 2 == 1 && o.step > 0 && o.threads > 0 && o.scale > 0 && o.path != 99 &&
-         o.batch >= 1 && o.batch <= 32;
+         o.batch >= 1 && o.batch <= 32 && o.maxFrames >= 1 && o.maxFrames <= 100000000;
 }
 
 std::uint64_t mix(std::uint64_t x) {
@@ -117,11 +119,13 @@ std::uint64_t mix(std::uint64_t x) {
   return x ^ (x >> 31);
 }
 
+// The frames of one point: the next frame number to draw, the frame errors so far (which
+// stop the workers), and each frame's bit errors by frame number.
 struct Counts {
+  explicit Counts(std::uint64_t frames) : bitErrors(frames) {}
   std::atomic<std::uint64_t> nextFrame{0};
-  std::atomic<std::uint64_t> frames{0};
   std::atomic<std::uint64_t> frameErrors{0};
-  std::atomic<std::uint64_t> bitErrors{0};
+  std::vector<std::uint32_t> bitErrors;
 };
 
 // One frame: its information bits, its soft streams and its decisions.
@@ -173,6 +177,7 @@ bool runWorker(const Options& o, double esN0Db, std::uint64_t pointSeed, Counts&
   std::vector<Frame> frames(o.batch);
   std::vector<vexlon_ip_corvane_inputs> in(o.batch);
   std::vector<vexlon_ip_corvane_outputs> out(o.batch);
+  std::vector<std::uint64_t> frameNumbers(o.batch);
   const std::uint32_t N = o.K + 4;
   bool ok = true;
   while (ok && counts.frameErrors.load() < o.minErrors) {
@@ -180,19 +185,20 @@ bool runWorker(const Options& o, double esN0Db, std::uint64_t pointSeed, Counts&
     for (; count < o.batch; ++count) {
       const std::uint64_t frame = counts.nextFrame.fetch_add(1);
       if (frame >= o.maxFrames) break;
+      frameNumbers[count] = frame;
       Frame& f = frames[count];
       ok = ok && makeFrame(o, channel, pointSeed, frame, f);
-      in[count] = {o.K, o.iterations, 1, 0, f.soft[0].data(), N, f.soft[1].data(), N,
-                   f.soft[2].data(), N, 0, 0};
+      in[count] = {
+          o.K, o.iterations, 1, 0, f.soft[0].data(), N, f.soft[1].data(), N, f.soft[2].data(), N, 0,
+          0};
       out[count] = {0, 0, f.decided.data(), o.K};
     }
     if (count == 0) break;
     ok = ok && vexlon_ip_corvane_bitacc_simulate_batch(model, in.data(), count, out.data()) == 0;
     for (std::uint32_t i = 0; ok && i < count; ++i) {
-      std::uint64_t errors = 0;
+      std::uint32_t errors = 0;
       for (std::uint32_t k = 0; k < o.K; ++k) errors += frames[i].decided[k] != frames[i].c[k];
-      counts.frames.fetch_add(1);
-      counts.bitErrors.fetch_add(errors);
+      counts.bitErrors[frameNumbers[i]] = errors;
       if (errors != 0) counts.frameErrors.fetch_add(1);
     }
   }
@@ -210,11 +216,12 @@ int main(int argc, char** argv) {
   }
   const double rate = static_cast<double>(o.K) / (3.0 * o.K + 12.0);
   const char* paths[] = {"automatic", "scalar", "vector"};
-  std::printf("# K %u, algorithm %u, units %u, iterations %u, extrinsic bits %u,"
-              " scale %.3g raw/LLR, correction for %u steps/unit, %s decoder, batch %u,"
-              " BPSK over AWGN, rate %u/%u\n",
-              o.K, o.algorithm, o.units, o.iterations, o.extrinsicBits, o.scale, o.steps,
-              paths[o.path], o.batch, o.K, 3 * o.K + 12);
+  std::printf(
+      "# K %u, algorithm %u, units %u, iterations %u, extrinsic bits %u,"
+      " scale %.3g raw/LLR, correction for %u steps/unit, %s decoder, batch %u,"
+      " BPSK over AWGN, rate %u/%u\n",
+      o.K, o.algorithm, o.units, o.iterations, o.extrinsicBits, o.scale, o.steps, paths[o.path],
+      o.batch, o.K, 3 * o.K + 12);
   std::printf("# stop at %llu frame errors or %llu frames\n",
               static_cast<unsigned long long>(o.minErrors),
               static_cast<unsigned long long>(o.maxFrames));
@@ -224,7 +231,7 @@ int main(int argc, char** argv) {
     const double ebN0Db = o.from + point * o.step;
     if (ebN0Db > o.to + 1e-9) break;
     const double esN0Db = ebN0Db + 10.0 * std::log10(rate);
-    Counts counts;
+    Counts counts(o.maxFrames);
     std::vector<std::thread> workers;
     std::atomic<bool> failed{false};
     const std::uint64_t pointSeed = mix(o.seed * 1000 + static_cast<std::uint64_t>(point));
@@ -238,11 +245,20 @@ int main(int argc, char** argv) {
       std::fprintf(stderr, "turbo_fer: the model refused the configuration or a frame\n");
       return 1;
     }
-    const double frames = static_cast<double>(counts.frames.load());
+    // The point counts frames 0..F-1, F the first frame count with enough frame errors (or
+    // every frame drawn): the same table for any number of threads and batch size.
+    std::uint64_t frames = 0, frameErrors = 0, bitErrors = 0;
+    const std::uint64_t drawn = std::min<std::uint64_t>(counts.nextFrame.load(), o.maxFrames);
+    while (frames < drawn && frameErrors < o.minErrors) {
+      bitErrors += counts.bitErrors[frames];
+      frameErrors += counts.bitErrors[frames] != 0 ? 1 : 0;
+      ++frames;
+    }
     std::printf("| %.2f | %llu | %llu | %.3e | %.3e |\n", ebN0Db,
-                static_cast<unsigned long long>(counts.frames.load()),
-                static_cast<unsigned long long>(counts.frameErrors.load()),
-                counts.frameErrors.load() / frames, counts.bitErrors.load() / (frames * o.K));
+                static_cast<unsigned long long>(frames),
+                static_cast<unsigned long long>(frameErrors),
+                static_cast<double>(frameErrors) / static_cast<double>(frames),
+                static_cast<double>(bitErrors) / (static_cast<double>(frames) * o.K));
     std::fflush(stdout);
   }
   return 0;
