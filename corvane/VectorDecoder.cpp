@@ -57,6 +57,19 @@ struct LogMapCombine {
 // branch metrics Lu and Lp exchanged, and state 0 stays register 0.
 constexpr int kSigma[kStates] = {0, 4, 2, 6, 1, 5, 3, 7};
 
+// f(1), ..., f(7) written out, so that arrays of state registers indexed by the argument stay
+// in registers (a loop over them would keep them in memory).
+template <class F>
+HWY_INLINE void forStates1To7(const F& f) {
+  f(1);
+  f(2);
+  f(3);
+  f(4);
+  f(5);
+  f(6);
+  f(7);
+}
+
 // One step of the forward recursion (forwardStep) on the metrics of states 1..7 in m[1..7]
 // (state 0's is 0 before and after: every metric is kept relative to it), with Lu = g and
 // Lp = p; one step of the backward recursion on relabelled metrics with Lu = p and Lp = g.
@@ -112,23 +125,23 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_
   const std::size_t N = hn::Lanes(d);
   const V zero = hn::Zero(d);
   V a[kStates], r[kStates];
-  for (int m = 1; m < kStates; ++m) a[m] = hn::Load(d, states + m * N);
+  forStates1To7([&](int m) { a[m] = hn::Load(d, states + m * N); });
   for (std::size_t k = 0; k < length; ++k) {
     std::int16_t* store = alphaStore + k * 7 * N;
-    for (int m = 1; m < kStates; ++m) hn::Store(a[m], d, store + (m - 1) * N);
+    forStates1To7([&](int m) { hn::Store(a[m], d, store + (m - 1) * N); });
     trellisStep(combine, a, zero, hn::Load(d, lu + k * N), hn::Load(d, lp + k * N));
   }
-  for (int m = 1; m < kStates; ++m) hn::Store(a[m], d, states + m * N);
-  for (int m = 1; m < kStates; ++m) r[m] = hn::Load(d, states + (8 + m) * N);
+  forStates1To7([&](int m) { hn::Store(a[m], d, states + m * N); });
+  forStates1To7([&](int m) { r[m] = hn::Load(d, states + (8 + m) * N); });
   for (std::size_t k = length; k-- > 0;) {
     const std::int16_t* store = alphaStore + k * 7 * N;
-    for (int m = 1; m < kStates; ++m) a[m] = hn::Load(d, store + (m - 1) * N);
+    forStates1To7([&](int m) { a[m] = hn::Load(d, store + (m - 1) * N); });
     const V g = hn::Load(d, lu + k * N);
     const V p = hn::Load(d, lp + k * N);
     hn::Store(extrinsicOf(d, combine, a, r, zero, p), d, extrinsic + k * N);
     trellisStep(combine, r, zero, p, g);
   }
-  for (int m = 1; m < kStates; ++m) hn::Store(r[m], d, states + (8 + m) * N);
+  forStates1To7([&](int m) { hn::Store(r[m], d, states + (8 + m) * N); });
 }
 
 // The same for a lane group of at most half a vector: the forward recursion in the lower
@@ -148,20 +161,20 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
   const std::size_t last = length - 1;
   const V zero = hn::Zero(d);
   V m[kStates];
-  for (int i = 1; i < kStates; ++i) {
+  forStates1To7([&](int i) {
     m[i] = hn::Combine(d, hn::Load(dh, states + (8 + i) * N), hn::Load(dh, states + i * N));
-  }
+  });
   for (std::size_t t = 0; t < length; ++t) {
     std::int16_t* row = store + t * 7 * 2 * N;
-    for (int i = 1; i < kStates; ++i) hn::Store(m[i], d, row + (i - 1) * 2 * N);
+    forStates1To7([&](int i) { hn::Store(m[i], d, row + (i - 1) * 2 * N); });
     const V g = hn::Combine(d, hn::Load(dh, lp + (last - t) * N), hn::Load(dh, lu + t * N));
     const V p = hn::Combine(d, hn::Load(dh, lu + (last - t) * N), hn::Load(dh, lp + t * N));
     trellisStep(combine, m, zero, g, p);
   }
-  for (int i = 1; i < kStates; ++i) {
+  forStates1To7([&](int i) {
     hn::Store(hn::LowerHalf(dh, m[i]), dh, states + i * N);
     hn::Store(hn::UpperHalf(dh, m[i]), dh, states + (8 + i) * N);
-  }
+  });
   // Row t holds alpha_t below and beta_L-t above: steps k and k2 = L-1-k read alpha from
   // rows k and k2, and beta_k+1 and beta_k2+1 from rows k2 and k.
   for (std::size_t k = 0; k <= last - k; ++k) {
@@ -169,12 +182,12 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
     const std::int16_t* rowK = store + k * 7 * 2 * N;
     const std::int16_t* rowK2 = store + k2 * 7 * 2 * N;
     V a[kStates], r[kStates];
-    for (int i = 1; i < kStates; ++i) {
+    forStates1To7([&](int i) {
       const V fromK = hn::Load(d, rowK + (i - 1) * 2 * N);
       const V fromK2 = hn::Load(d, rowK2 + (i - 1) * 2 * N);
       a[i] = hn::ConcatLowerLower(d, fromK2, fromK);
       r[i] = hn::ConcatUpperUpper(d, fromK, fromK2);
-    }
+    });
     const V p = hn::Combine(d, hn::Load(dh, lp + k2 * N), hn::Load(dh, lp + k * N));
     const V e = extrinsicOf(d, combine, a, r, zero, p);
     hn::Store(hn::UpperHalf(dh, e), dh, extrinsic + k2 * N);
