@@ -321,13 +321,19 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   std::int16_t* par[2] = {work.parity[0].get(), work.parity[1].get()};
   std::int16_t* lu = work.lu.get();
   std::int16_t* extrinsic = work.extrinsic.get();
-  // Every value of block b: its window w is segment s = b*P + w, in lane s % N of lane group
-  // s / N; lanes without a segment hold zeros.
-  const auto forEachValue = [&](std::size_t b, const auto& visit) {
-    for (std::size_t w = 0; w < P; ++w) {
-      const std::size_t s = b * P + w;
-      const std::size_t first = (s / N) * L * N + s % N;
-      for (std::size_t k = 0; k < L; ++k) visit(first + k * N, w * L + k);
+  // Every value of the group in array order (so that the array accesses stream): block b's
+  // window w is segment s = b*P + w, in lane s % N of lane group s / N (a lane group holds
+  // N / P whole blocks); lanes without a segment hold zeros.
+  const auto forEachValue = [&](const auto& visit) {
+    for (std::size_t group = 0; group < laneGroups; ++group) {
+      const std::size_t firstBlock = group * (N / P);
+      const std::size_t groupBlocks = std::min(N / P, count - firstBlock);
+      for (std::size_t k = 0; k < L; ++k) {
+        std::size_t j = (group * L + k) * N;
+        for (std::size_t b = firstBlock; b < firstBlock + groupBlocks; ++b) {
+          for (std::size_t i = k; i < K; i += L) visit(j++, b, i);
+        }
+      }
     }
   };
   if (S % N != 0) {
@@ -335,18 +341,19 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     std::fill_n(par[0], positions, std::int16_t{0});
     std::fill_n(par[1], positions, std::int16_t{0});
   }
-  std::int16_t* received[3] = {work.received.get(), work.received.get() + K,
-                               work.received.get() + 2 * K};
+  // Streams d0, d1, d2 of block b saturated at received + (3b + stream) * K.
+  std::int16_t* received = work.received.get();
   for (std::size_t b = 0; b < count; ++b) {
-    saturateSoftValues(d, blocks[b]->d0, received[0], K);
-    saturateSoftValues(d, blocks[b]->d1, received[1], K);
-    saturateSoftValues(d, blocks[b]->d2, received[2], K);
-    forEachValue(b, [&](std::size_t j, std::size_t i) {
-      sys[0][j] = received[0][i];
-      par[0][j] = received[1][i];
-      par[1][j] = received[2][i];
-    });
+    saturateSoftValues(d, blocks[b]->d0, received + (3 * b) * K, K);
+    saturateSoftValues(d, blocks[b]->d1, received + (3 * b + 1) * K, K);
+    saturateSoftValues(d, blocks[b]->d2, received + (3 * b + 2) * K, K);
   }
+  forEachValue([&](std::size_t j, std::size_t b, std::size_t i) {
+    const std::int16_t* streams = received + 3 * b * K + i;
+    sys[0][j] = streams[0];
+    par[0][j] = streams[K];
+    par[1][j] = streams[2 * K];
+  });
   const auto unchanged = [](auto v) { return v; };
   std::fill_n(lu, positions, std::int16_t{0});
   permuteSteps(d, unchanged, work, 1, laneGroups, L, sys[0], lu, sys[1]);
@@ -428,12 +435,9 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     const auto sum = hn::SaturatedAdd(hn::Load(d, lu + j), hn::Load(d, extrinsic + j));
     hn::Store(hn::VecFromMask(d, hn::Lt(sum, hn::Zero(d))), d, lu + j);
   }
-  for (std::size_t b = 0; b < count; ++b) {
-    std::uint8_t* bits = blocks[b]->bits;
-    forEachValue(b, [&](std::size_t j, std::size_t i) {
-      bits[pi[i]] = static_cast<std::uint8_t>(lu[j] == 0 ? 1 : 0);
-    });
-  }
+  forEachValue([&](std::size_t j, std::size_t b, std::size_t i) {
+    blocks[b]->bits[pi[i]] = static_cast<std::uint8_t>(lu[j] == 0 ? 1 : 0);
+  });
 }
 
 void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
@@ -487,7 +491,7 @@ bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& cor
   const std::size_t n = work.positions;
   bool ok = work.lu.allocate(n) && work.extrinsic.allocate(n) &&
             work.alpha.allocate(7 * groupLanes * L) && work.laneStates.allocate(16 * 32) &&
-            work.pi.allocate(K) && work.piInverse.allocate(K) && work.received.allocate(3 * K);
+            work.pi.allocate(K) && work.piInverse.allocate(K) && work.received.allocate(3 * K * B);
   for (int decoder = 0; decoder < 2; ++decoder) {
     ok = ok && work.systematic[decoder].allocate(n) && work.parity[decoder].allocate(n) &&
          work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L);
