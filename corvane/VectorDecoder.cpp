@@ -112,13 +112,14 @@ HWY_INLINE V extrinsicOf(D d, const Combine& combine, const V (&a)[kStates], con
 
 // One lane group of one half-iteration, lanes = segments: the forward recursion from the
 // alpha metrics in states[0..7] (one row of lanes per state) over `length` steps, storing
-// every alpha, then the backward recursion from the relabelled beta metrics in
-// states[8..15] with the raw extrinsic value of every step. Leaves the reached alpha and
-// (relabelled) beta in states.
+// the alpha of every stride-th step, then the backward recursion from the relabelled beta
+// metrics in states[8..15] with the raw extrinsic value of every step (an alpha not stored
+// is made again from the last stored one). Leaves the reached alpha and (relabelled) beta in
+// states. A stride of 2 halves the store for long windows, which then stays in the cache.
 template <class D, class Combine>
 HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_t* HWY_RESTRICT lu,
                                   const std::int16_t* HWY_RESTRICT lp, std::size_t length,
-                                  std::int16_t* HWY_RESTRICT alphaStore,
+                                  std::size_t stride, std::int16_t* HWY_RESTRICT alphaStore,
                                   std::int16_t* HWY_RESTRICT states,
                                   std::int16_t* HWY_RESTRICT extrinsic) {
   using V = decltype(hn::Zero(d));
@@ -127,15 +128,21 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_
   V a[kStates], r[kStates];
   forStates1To7([&](int m) { a[m] = hn::Load(d, states + m * N); });
   for (std::size_t k = 0; k < length; ++k) {
-    std::int16_t* store = alphaStore + k * 7 * N;
-    forStates1To7([&](int m) { hn::Store(a[m], d, store + (m - 1) * N); });
+    if (k % stride == 0) {
+      std::int16_t* store = alphaStore + k / stride * 7 * N;
+      forStates1To7([&](int m) { hn::Store(a[m], d, store + (m - 1) * N); });
+    }
     trellisStep(combine, a, zero, hn::Load(d, lu + k * N), hn::Load(d, lp + k * N));
   }
   forStates1To7([&](int m) { hn::Store(a[m], d, states + m * N); });
   forStates1To7([&](int m) { r[m] = hn::Load(d, states + (8 + m) * N); });
   for (std::size_t k = length; k-- > 0;) {
-    const std::int16_t* store = alphaStore + k * 7 * N;
+    const std::size_t stored = k - k % stride;
+    const std::int16_t* store = alphaStore + stored / stride * 7 * N;
     forStates1To7([&](int m) { a[m] = hn::Load(d, store + (m - 1) * N); });
+    for (std::size_t t = stored; t < k; ++t) {
+      trellisStep(combine, a, zero, hn::Load(d, lu + t * N), hn::Load(d, lp + t * N));
+    }
     const V g = hn::Load(d, lu + k * N);
     const V p = hn::Load(d, lp + k * N);
     hn::Store(extrinsicOf(d, combine, a, r, zero, p), d, extrinsic + k * N);
@@ -314,6 +321,8 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   const std::size_t positions = laneGroups * L * N;
   const std::uint32_t iterations = blocks[0]->iterations;
   const bool paired = laneGroups == 1 && hn::Lanes(dPaired) == 2 * N;
+  // Every second alpha stored when all would take more than 1 MiB.
+  const std::size_t stride = 7 * N * L * sizeof(std::int16_t) > (std::size_t{1} << 20) ? 2 : 1;
   if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
 
   const std::uint16_t* pi = work.pi.get();
@@ -364,15 +373,15 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     work.tails[2 * b + 1] = betas[1];
   }
   StateMetrics* boundaries = work.boundaries.get();
-  const std::size_t stride = work.maxSegments;
-  for (std::size_t i = 0; i < 8 * stride; ++i) boundaries[i] = StateMetrics{};
+  const std::size_t segments = work.maxSegments;
+  for (std::size_t i = 0; i < 8 * segments; ++i) boundaries[i] = StateMetrics{};
   const StateMetrics start = knownStateZero();
 
   const auto halfIteration = [&](const auto& combine, int decoder) {
-    StateMetrics* alphaIn = boundaries + (4 * decoder + 0) * stride;
-    StateMetrics* betaIn = boundaries + (4 * decoder + 1) * stride;
-    StateMetrics* alphaOut = boundaries + (4 * decoder + 2) * stride;
-    StateMetrics* betaOut = boundaries + (4 * decoder + 3) * stride;
+    StateMetrics* alphaIn = boundaries + (4 * decoder + 0) * segments;
+    StateMetrics* betaIn = boundaries + (4 * decoder + 1) * segments;
+    StateMetrics* alphaOut = boundaries + (4 * decoder + 2) * segments;
+    StateMetrics* betaOut = boundaries + (4 * decoder + 3) * segments;
     std::int16_t* states = work.laneStates.get();
     for (std::size_t group = 0; group < laneGroups; ++group) {
       for (std::size_t lane = 0; lane < N; ++lane) {
@@ -393,8 +402,8 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
         decodeLaneGroupPaired(dPaired, combine, lu, par[decoder], L, work.alpha.get(), states,
                               extrinsic);
       } else {
-        decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, work.alpha.get(), states,
-                        extrinsic + first);
+        decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, stride,
+                        work.alpha.get(), states, extrinsic + first);
       }
       for (std::size_t lane = 0; lane < N && group * N + lane < S; ++lane) {
         const std::size_t s = group * N + lane;
