@@ -24,29 +24,60 @@ void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::siz
 }
 #else
 
-// max for max-log-MAP.
+// max for max-log-MAP; pair() combines two pairs of operands.
 struct MaxCombine {
   template <class V>
-  HWY_INLINE V operator()(V a, V b) const {
-    return hn::Max(a, b);
+  HWY_INLINE void pair(V a0, V b0, V a1, V b1, V& out0, V& out1) const {
+    out0 = hn::Max(a0, b0);
+    out1 = hn::Max(a1, b1);
   }
 };
 
-// max* for log-MAP: max(a, b) plus the correction of |a - b|, counted as the thresholds
-// above the difference (the table falls monotonically, so this is the table's entry).
+// max* for log-MAP: max(a, b) plus the correction of |a - b|. The differences of two
+// combinations are saturated to bytes and looked up 15 entries at a time in 16-byte tables
+// (byte shuffles): chunk c adds f(15c + min(x, 15)) - f(15c + 15), x = (d - 15c) floored at
+// 0, and the chunks' sum telescopes to f(d) once the last chunk reaches the table's final 0.
+// A table longer than 256 entries (more than 58 steps per unit) counts the thresholds above
+// the difference instead (the table falls monotonically, so this is its entry).
 struct LogMapCombine {
-  const std::int16_t* threshold;
-  int count;
+  const VectorWorkspace* work;
   template <class V>
-  HWY_INLINE V operator()(V a, V b) const {
+  HWY_INLINE V thresholdsAbove(V difference) const {
     const hn::DFromV<V> d;
-    const V larger = hn::Max(a, b);
-    const V difference = hn::SaturatedSub(larger, hn::Min(a, b));
-    V below = hn::Zero(d);
-    for (int v = 0; v < count; ++v) {
-      below = hn::Sub(below, hn::VecFromMask(d, hn::Lt(difference, hn::Set(d, threshold[v]))));
+    V above = hn::Zero(d);  // each true mask is -1
+    for (int v = 0; v < work->thresholdCount; ++v) {
+      above =
+          hn::Sub(above, hn::VecFromMask(d, hn::Lt(difference, hn::Set(d, work->threshold[v]))));
     }
-    return hn::Add(larger, below);
+    return above;
+  }
+  template <class V>
+  HWY_INLINE void pair(V a0, V b0, V a1, V b1, V& out0, V& out1) const {
+    const hn::DFromV<V> d;
+    const V larger0 = hn::Max(a0, b0);
+    const V larger1 = hn::Max(a1, b1);
+    const V difference0 = hn::SaturatedSub(larger0, hn::Min(a0, b0));
+    const V difference1 = hn::SaturatedSub(larger1, hn::Min(a1, b1));
+    if (work->chunkCount == 0) {
+      out0 = hn::Add(larger0, thresholdsAbove(difference0));
+      out1 = hn::Add(larger1, thresholdsAbove(difference1));
+      return;
+    }
+    const hn::Repartition<std::uint8_t, decltype(d)> bytes;
+    const hn::Rebind<std::uint8_t, decltype(d)> halfBytes;
+    const auto packed = hn::Combine(bytes, hn::DemoteTo(halfBytes, difference1),
+                                    hn::DemoteTo(halfBytes, difference0));
+    const auto fifteen = hn::Set(bytes, std::uint8_t{15});
+    auto correction = hn::Zero(bytes);
+    for (int c = 0; c < work->chunkCount; ++c) {
+      const auto x = hn::SaturatedSub(packed, hn::Set(bytes, static_cast<std::uint8_t>(15 * c)));
+      const auto table = hn::LoadDup128(bytes, work->chunkTable + 16 * c);
+      correction = hn::Add(correction, hn::TableLookupBytes(table, hn::Min(x, fifteen)));
+    }
+    out0 = hn::Add(larger0, hn::BitCast(d, hn::PromoteTo(hn::Rebind<std::uint16_t, decltype(d)>(),
+                                                         hn::LowerHalf(halfBytes, correction))));
+    out1 = hn::Add(larger1, hn::BitCast(d, hn::PromoteTo(hn::Rebind<std::uint16_t, decltype(d)>(),
+                                                         hn::UpperHalf(halfBytes, correction))));
   }
 };
 
@@ -76,14 +107,11 @@ HWY_INLINE void forStates1To7(const F& f) {
 template <class Combine, class V>
 HWY_INLINE void trellisStep(const Combine& combine, V (&m)[kStates], V zero, V g, V p) {
   const V both = hn::Add(g, p);
-  const V n0 = combine(zero, hn::Add(m[1], both));
-  const V n4 = combine(both, m[1]);
-  const V n1 = combine(hn::Add(m[2], g), hn::Add(m[3], p));
-  const V n5 = combine(hn::Add(m[2], p), hn::Add(m[3], g));
-  const V n2 = combine(hn::Add(m[4], p), hn::Add(m[5], g));
-  const V n6 = combine(hn::Add(m[4], g), hn::Add(m[5], p));
-  const V n3 = combine(hn::Add(m[6], both), m[7]);
-  const V n7 = combine(m[6], hn::Add(m[7], both));
+  V n0, n1, n2, n3, n4, n5, n6, n7;
+  combine.pair(zero, hn::Add(m[1], both), both, m[1], n0, n4);
+  combine.pair(hn::Add(m[2], g), hn::Add(m[3], p), hn::Add(m[2], p), hn::Add(m[3], g), n1, n5);
+  combine.pair(hn::Add(m[4], p), hn::Add(m[5], g), hn::Add(m[4], g), hn::Add(m[5], p), n2, n6);
+  combine.pair(hn::Add(m[6], both), m[7], m[6], hn::Add(m[7], both), n3, n7);
   m[1] = hn::Sub(n1, n0);
   m[2] = hn::Sub(n2, n0);
   m[3] = hn::Sub(n3, n0);
@@ -98,15 +126,19 @@ template <class D, class Combine, class V>
 HWY_INLINE V extrinsicOf(D d, const Combine& combine, const V (&a)[kStates], const V (&r)[kStates],
                          V zero, V p) {
   const V b1 = r[4], b2 = r[2], b3 = r[6], b4 = r[1], b5 = r[5], b6 = r[3], b7 = r[7];
-  const V oneParity0 = combine(combine(hn::Add(a[2], b1), hn::Add(a[3], b5)),
-                               combine(hn::Add(a[4], b6), hn::Add(a[5], b2)));
-  const V oneParity1 = combine(combine(b4, a[1]), combine(hn::Add(a[6], b3), hn::Add(a[7], b7)));
-  const V zeroParity0 =
-      combine(combine(zero, hn::Add(a[1], b4)), combine(hn::Add(a[6], b7), hn::Add(a[7], b3)));
-  const V zeroParity1 = combine(combine(hn::Add(a[2], b5), hn::Add(a[3], b1)),
-                                combine(hn::Add(a[4], b2), hn::Add(a[5], b6)));
-  const V e = hn::SaturatedSub(combine(oneParity0, hn::Add(oneParity1, p)),
-                               combine(zeroParity0, hn::Add(zeroParity1, p)));
+  // The four groups of equal (u, p), each combined pairwise as combine4 does.
+  V one0a, one0b, one1a, one1b, zero0a, zero0b, zero1a, zero1b;
+  combine.pair(hn::Add(a[2], b1), hn::Add(a[3], b5), hn::Add(a[4], b6), hn::Add(a[5], b2), one0a,
+               one0b);
+  combine.pair(b4, a[1], hn::Add(a[6], b3), hn::Add(a[7], b7), one1a, one1b);
+  combine.pair(zero, hn::Add(a[1], b4), hn::Add(a[6], b7), hn::Add(a[7], b3), zero0a, zero0b);
+  combine.pair(hn::Add(a[2], b5), hn::Add(a[3], b1), hn::Add(a[4], b2), hn::Add(a[5], b6), zero1a,
+               zero1b);
+  V oneParity0, oneParity1, zeroParity0, zeroParity1, one, none;
+  combine.pair(one0a, one0b, one1a, one1b, oneParity0, oneParity1);
+  combine.pair(zero0a, zero0b, zero1a, zero1b, zeroParity0, zeroParity1);
+  combine.pair(oneParity0, hn::Add(oneParity1, p), zeroParity0, hn::Add(zeroParity1, p), one, none);
+  const V e = hn::SaturatedSub(one, none);
   return hn::Max(e, hn::Set(d, -32767));
 }
 
@@ -402,8 +434,8 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
         decodeLaneGroupPaired(dPaired, combine, lu, par[decoder], L, work.alpha.get(), states,
                               extrinsic);
       } else {
-        decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, stride,
-                        work.alpha.get(), states, extrinsic + first);
+        decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, stride, work.alpha.get(),
+                        states, extrinsic + first);
       }
       for (std::size_t lane = 0; lane < N && group * N + lane < S; ++lane) {
         const std::size_t s = group * N + lane;
@@ -434,7 +466,7 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     }
   };
   if (work.algorithm == Algorithm::LogMap) {
-    iterate(LogMapCombine{work.threshold, work.thresholdCount});
+    iterate(LogMapCombine{&work});
   } else {
     iterate(MaxCombine{});
   }
@@ -482,6 +514,15 @@ bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& cor
   work.algorithm = config.algorithm;
   work.extrinsicLimit = (1 << (config.extrinsicBits - 1)) - 1;
   work.thresholdCount = correction[0];
+  const int size = correction.size();
+  work.chunkCount = size <= 256 ? (size - 1 + 14) / 15 : 0;
+  const auto f = [&](int d) { return correction[d < size ? d : size - 1]; };
+  for (int c = 0; c < work.chunkCount; ++c) {
+    for (int x = 0; x < 16; ++x) {
+      work.chunkTable[16 * c + x] =
+          static_cast<std::uint8_t>(f(15 * c + std::min(x, 15)) - f(15 * c + 15));
+    }
+  }
   for (int v = 1; v <= work.thresholdCount; ++v) {
     int d = 0;
     while (correction[d] >= v) ++d;

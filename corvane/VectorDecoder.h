@@ -75,6 +75,10 @@ struct VectorWorkspace {
   // v = 1..thresholdCount: the correction of d is the number of thresholds above d.
   std::int16_t threshold[64] = {};
   int thresholdCount = 0;
+  // The same correction as 16-byte tables of 15 entries each (see LogMapCombine), for
+  // tables of at most 256 entries; chunkCount 0 otherwise.
+  std::uint8_t chunkTable[17 * 16] = {};
+  int chunkCount = 0;
   std::size_t positions = 0;                 // capacity of the per-position arrays
   AlignedArray<std::int16_t> systematic[2];  // per decoder: natural, interleaved order
   AlignedArray<std::int16_t> parity[2];
