@@ -11,13 +11,19 @@
 // radix-2 butterfly: the branches 2j -> j and 2j+1 -> j+4 carry u = j & 1, p = j >> 1
 // ("type A"), the other two the complements ("type B").
 //
-// Widths (16-bit lanes, ready for 8-lane SIMD): a step's branch metric is u*Lu + p*Lp with
-// Lu = systematic + a priori (|Lu| <= 128 + 1023) and Lp = parity (|Lp| <= 128). Within one
-// step the state metrics of reachable states differ by at most 3 * (|Lu| + |Lp|) < 3900,
-// since every state reaches every other in three steps. Each step subtracts the metric of
-// state 0 from all eight (normalisation), so metrics stay within -(kUnreachable + 3900) ..
-// 3900, and alpha + parity + beta within -16400..8000: every sum fits a 16-bit lane. The
-// raw extrinsic value is formed in 32 bits and saturated to 16.
+// Widths (16-bit lanes, as the vectorised decoder uses them): a step's branch metric is
+// u*Lu + p*Lp with Lu = systematic + a priori (|Lu| <= 128 + 1023) and Lp = parity
+// (|Lp| <= 128), so the branch metrics of one step lie within a range |Lu| + |Lp| <= 1279
+// wide. Every state reaches every other in three steps, so within one step the metrics of
+// reachable states differ by at most three such ranges plus three log-MAP corrections:
+// 3 * 1279 + 3 * 44 < 4000 (the correction is at most round(s * ln 2), 44 at the largest
+// scale s = 64; 0 for max-log-MAP). Each step subtracts the metric of state 0 from all
+// eight (normalisation), so alpha stays within -(kUnreachable + 4000) .. 4000 and beta, whose
+// terminated end already reaches every state, within -4000 .. 4000; a state metric plus a
+// branch metric stays within -13500..5300, and alpha + parity + beta within -16400..8200, a
+// combination of two of them at most 44 above: every sum fits a 16-bit lane. The raw
+// extrinsic value, a difference of two combinations, is formed in 32 bits (saturating 16-bit
+// subtraction in the vectorised decoder) and saturated to 16.
 #ifndef CORVANE_CONSTITUENTDECODER_H
 #define CORVANE_CONSTITUENTDECODER_H
 
