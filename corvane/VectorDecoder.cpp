@@ -37,7 +37,7 @@ struct MaxCombine {
 // combinations are saturated to bytes and looked up 15 entries at a time in 16-byte tables
 // (byte shuffles): chunk c adds f(15c + min(x, 15)) - f(15c + 15), x = (d - 15c) floored at
 // 0, and the chunks' sum telescopes to f(d) once the last chunk reaches the table's final 0.
-// A table longer than 256 entries (more than 58 steps per unit) counts the thresholds above
+// A table longer than 256 entries (more than 54 steps per unit) counts the thresholds above
 // the difference instead (the table falls monotonically, so this is its entry).
 struct LogMapCombine {
   const VectorWorkspace* work;
