@@ -311,6 +311,43 @@ HWY_NOINLINE void saturateSoftValues(D /* d */, const std::int32_t* in, std::int
   for (; i < count; ++i) out[i] = softValue(in[i]);
 }
 
+// out[t * stride + s] = source[s][t] for s, t in 0..7: eight values of eight segments
+// transposed into eight rows (16-bit, 32-bit and 64-bit interleaves).
+template <class D8>
+HWY_INLINE void transpose8(D8 d8, const std::int16_t* const (&source)[8], std::int16_t* out,
+                           std::size_t stride) {
+  const hn::Repartition<std::int32_t, D8> d32;
+  const hn::Repartition<std::int64_t, D8> d64;
+  const auto r0 = hn::LoadU(d8, source[0]), r1 = hn::LoadU(d8, source[1]);
+  const auto r2 = hn::LoadU(d8, source[2]), r3 = hn::LoadU(d8, source[3]);
+  const auto r4 = hn::LoadU(d8, source[4]), r5 = hn::LoadU(d8, source[5]);
+  const auto r6 = hn::LoadU(d8, source[6]), r7 = hn::LoadU(d8, source[7]);
+  const auto t0 = hn::BitCast(d32, hn::InterleaveLower(d8, r0, r1));
+  const auto t1 = hn::BitCast(d32, hn::InterleaveUpper(d8, r0, r1));
+  const auto t2 = hn::BitCast(d32, hn::InterleaveLower(d8, r2, r3));
+  const auto t3 = hn::BitCast(d32, hn::InterleaveUpper(d8, r2, r3));
+  const auto t4 = hn::BitCast(d32, hn::InterleaveLower(d8, r4, r5));
+  const auto t5 = hn::BitCast(d32, hn::InterleaveUpper(d8, r4, r5));
+  const auto t6 = hn::BitCast(d32, hn::InterleaveLower(d8, r6, r7));
+  const auto t7 = hn::BitCast(d32, hn::InterleaveUpper(d8, r6, r7));
+  const auto u0 = hn::BitCast(d64, hn::InterleaveLower(d32, t0, t2));
+  const auto u1 = hn::BitCast(d64, hn::InterleaveUpper(d32, t0, t2));
+  const auto u2 = hn::BitCast(d64, hn::InterleaveLower(d32, t1, t3));
+  const auto u3 = hn::BitCast(d64, hn::InterleaveUpper(d32, t1, t3));
+  const auto u4 = hn::BitCast(d64, hn::InterleaveLower(d32, t4, t6));
+  const auto u5 = hn::BitCast(d64, hn::InterleaveUpper(d32, t4, t6));
+  const auto u6 = hn::BitCast(d64, hn::InterleaveLower(d32, t5, t7));
+  const auto u7 = hn::BitCast(d64, hn::InterleaveUpper(d32, t5, t7));
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u0, u4)), d8, out + 0 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u0, u4)), d8, out + 1 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u1, u5)), d8, out + 2 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u1, u5)), d8, out + 3 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u2, u6)), d8, out + 4 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u2, u6)), d8, out + 5 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u3, u7)), d8, out + 6 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u3, u7)), d8, out + 7 * stride);
+}
+
 // The tables of permuteSteps for the group's K, from the QPP permutation: Pi(w*L + k) is
 // congruent to Pi(k) modulo L for every window w (Pi(x + L) - Pi(x) = L * (f1 + f2 * (2x + L))),
 // so the interleaved step k of every window reads one natural step, and back.
@@ -389,12 +426,32 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     saturateSoftValues(d, blocks[b]->d1, received + (3 * b + 1) * K, K);
     saturateSoftValues(d, blocks[b]->d2, received + (3 * b + 2) * K, K);
   }
-  forEachValue([&](std::size_t j, std::size_t b, std::size_t i) {
-    const std::int16_t* streams = received + 3 * b * K + i;
-    sys[0][j] = streams[0];
-    par[0][j] = streams[K];
-    par[1][j] = streams[2 * K];
-  });
+  // Into the lanes: eight segments by eight steps at a time, the rest value by value.
+  const hn::CappedTag<std::int16_t, 8> d8;
+  std::int16_t* arrays[3] = {sys[0], par[0], par[1]};
+  const std::size_t fullRows = L - L % 8;
+  for (std::size_t first = 0; first < S; first += 8) {
+    const std::size_t group = first / N;
+    const std::size_t lanes = std::min<std::size_t>(8, S - first);
+    for (int stream = 0; stream < 3; ++stream) {
+      const std::int16_t* source[8];
+      for (std::size_t s = 0; s < lanes; ++s) {
+        const std::size_t segment = first + s;
+        source[s] = received + (3 * (segment / P) + stream) * K + (segment % P) * L;
+      }
+      std::int16_t* out = arrays[stream] + group * L * N + first % N;
+      const std::size_t vectorRows = lanes == 8 ? fullRows : 0;
+      for (std::size_t k = 0; k < vectorRows; k += 8) {
+        const std::int16_t* const at[8] = {source[0] + k, source[1] + k, source[2] + k,
+                                           source[3] + k, source[4] + k, source[5] + k,
+                                           source[6] + k, source[7] + k};
+        transpose8(d8, at, out + k * N, N);
+      }
+      for (std::size_t k = vectorRows; k < L; ++k) {
+        for (std::size_t s = 0; s < lanes; ++s) out[k * N + s] = source[s][k];
+      }
+    }
+  }
   const auto unchanged = [](auto v) { return v; };
   std::fill_n(lu, positions, std::int16_t{0});
   permuteSteps(d, unchanged, work, 1, laneGroups, L, sys[0], lu, sys[1]);
