@@ -539,6 +539,11 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
 }
 
 void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
+  if (work.algorithm == Algorithm::LogMap && count * work.processingUnits == 1) {
+    // One log-MAP window fills too few lanes to pay for the vector table look-ups.
+    work.oneLane.decode(*blocks[0]);
+    return;
+  }
   const std::size_t maxLanes = hn::Lanes(hn::ScalableTag<std::int16_t>());
   const std::size_t lanes = laneGroupWidth(count * work.processingUnits, maxLanes);
   if (lanes <= 8) {

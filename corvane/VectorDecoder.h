@@ -20,9 +20,10 @@
 //
 // The vector code is compiled for every x86 instruction set Highway knows (SSSE3, SSE4, AVX2,
 // AVX-512) and the best the processor runs is chosen at the first call; on a processor
-// without SSSE3, Highway's one-lane fallback decodes with the scalar decoder. A build without
-// Highway (CORVANE_SIMD off, Highway missing, or the 32-bit build) has no vectorised decoder:
-// vectorDecoderAvailable() is false and init() refuses.
+// without SSSE3, Highway's one-lane fallback decodes with the scalar decoder, which also
+// takes a log-MAP block of one window (too few lanes to pay for the vector table look-ups). A build
+// without Highway (CORVANE_SIMD off, Highway missing, or the 32-bit build) has no vectorised
+// decoder: vectorDecoderAvailable() is false and init() refuses.
 #ifndef CORVANE_VECTORDECODER_H
 #define CORVANE_VECTORDECODER_H
 
@@ -98,7 +99,7 @@ struct VectorWorkspace {
   std::unique_ptr<StateMetrics[]> boundaries;
   std::unique_ptr<StateMetrics[]> tails;  // [block][decoder]
   std::size_t maxSegments = 0;
-  TurboDecoder oneLane;  // the decoder of Highway's one-lane fallback target
+  TurboDecoder oneLane;  // scalar decoder: one-lane fallback target, one log-MAP window
 };
 
 class VectorDecoder {
