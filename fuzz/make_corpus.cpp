@@ -2,7 +2,7 @@
 // kind from the transmitter (PUSCH with and without UCI, retransmissions, CQI only, PUCCH
 // with and without ACK, both cyclic prefixes), and from each of them the calls of the
 // status-code tests (each control field one step past its limit, null and short arrays).
-// Usage: make_corpus FOLDER (creates FOLDER/sch, FOLDER/cch, FOLDER/dump).
+// Usage: make_corpus FOLDER (creates FOLDER/sch, FOLDER/cch, FOLDER/dump, FOLDER/corvane).
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>
@@ -14,6 +14,7 @@
 #include "FuzzCalls.h"
 #include "tx/PucchTransmitter.h"
 #include "tx/PuschTransmitter.h"
+#include "tx/TurboEncoder.h"
 
 namespace {
 
@@ -158,6 +159,30 @@ int main(int argc, char** argv) {
       writeFile(root / "dump", "dump-" + std::to_string(n), dump);
       ++n;
     }
+  }
+  // The turbo model: noisy code blocks of a few sizes, alone and in a batch of three.
+  for (const bool batch : {false, true}) {
+    fz::FuzzOutput out;
+    out.byte(batch ? 2 : 0);
+    out.byte(0x01 | 0x04);  // 2 units, algorithm 1
+    out.byte(32);
+    if (batch) out.byte(3);
+    for (const std::uint32_t K : {std::uint32_t{batch ? 40u : 1024u}, 48u, 56u}) {
+      tx::TurboCodeword d;
+      tx::turboEncode(pattern(K, K), d);
+      const std::uint32_t index = K <= 512 ? (K - 40) / 8 : 60 + (K - 528) / 16;
+      out.byte(static_cast<std::uint8_t>(index));
+      out.byte(2);   // 3 iterations
+      out.byte(0);   // no null pointer
+      out.word(K);
+      for (const tx::Bits* stream : {&d.d0, &d.d1, &d.d2}) {
+        for (std::size_t i = 0; i < stream->size(); ++i) {
+          out.byte(static_cast<std::uint8_t>(((*stream)[i] != 0 ? 40 : -40) + int(i % 7) - 3));
+        }
+      }
+      if (!batch) break;
+    }
+    writeFile(root / "corvane", batch ? "batch" : "single", out);
   }
   return 0;
 }
