@@ -175,7 +175,7 @@ class Decoder:
         soft = soft_view(llr)
         streams: Tuple[Optional[np.ndarray], ...] = (None, None, None)
         harq_size = 0
-        if harq is not None:
+        if harq is not None and control.SCH_ND == 0:
             harq_values = soft_view(harq)
             if harq_values.ndim != 2 or harq_values.shape[0] != 3:
                 raise ValueError("harq must be a (3, n) array")

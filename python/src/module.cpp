@@ -23,6 +23,7 @@
 
 #include "tx/PucchTransmitter.h"
 #include "tx/PuschTransmitter.h"
+#include "tx/Segmentation.h"
 #include "vexlon_ip_brannoc_bitacc_cmodel.h"
 
 namespace py = pybind11;
@@ -82,9 +83,15 @@ vexlon_ip_brannoc_SCH_controlData schControl(const std::array<std::uint32_t, 23>
   return c;
 }
 
-// An upper bound of the HARQ length of a transport block: sum of K_r + 4 over at most 44
-// code blocks, each adding its CRC, fillers under 64 bits.
-std::uint32_t harqCapacity(std::uint32_t tbSize) { return tbSize + 24 + 44 * 28 + 64; }
+// The HARQ length of a transport block: K_r + 4 summed over its code blocks (0 without
+// one), so that the output arrays are exactly as long as the call fills them.
+std::uint32_t harqCapacity(std::uint32_t tbSize) {
+  if (tbSize == 0 || tbSize > 262143) {
+    return 0;
+  }
+  const brannoc::tx::CodeBlockSegmentation seg = brannoc::tx::segmentTransportBlock(tbSize);
+  return (seg.Kplus + 4) * seg.Cplus + (seg.Kminus + 4) * seg.Cminus;
+}
 
 const std::int32_t* softPointer(const std::optional<Int32Array>& array) {
   return array ? array->data() : nullptr;
@@ -121,7 +128,7 @@ class Decoder {
     const vexlon_ip_brannoc_SCH_inputs inputs{
         llr.size() == 0 ? nullptr : llr.data(), softPointer(sys), softPointer(p0),
         softPointer(p1), static_cast<std::uint32_t>(llr.size()), harqSize, control};
-    const std::uint32_t harq = std::max(harqCapacity(control.SCH_TBSIZE), harqSize);
+    const std::uint32_t harq = std::max<std::uint32_t>(harqCapacity(control.SCH_TBSIZE), 1);
     ByteArray data(std::max<std::uint32_t>(control.SCH_TBSIZE, 1));
     ByteArray ack(std::max<std::uint32_t>(control.SCH_ACK_OP_SIZE, 1));
     ByteArray ri(std::max<std::uint32_t>(control.SCH_RI_OP_SIZE, 1));

@@ -109,55 +109,72 @@ def test_soft_values_are_read_in_place():
     assert peak < outputs + sent.llr.nbytes // 4, peak
 
 
-def c_library_decode(sent):
-    """The same call through the C interface, with ctypes: data bits and HARQ buffers."""
-    lib = ctypes.CDLL(os.environ["BRANNOC_C_LIBRARY"])
-    u32, i32p, u8p = ctypes.c_uint32, ctypes.POINTER(ctypes.c_int32), ctypes.POINTER(ctypes.c_uint8)
+class CInterface:
+    """The decoder library called through its C interface with ctypes: one instance."""
 
-    class Generics(ctypes.Structure):
-        _fields_ = [(n, u32) for n in ("pu", "alg", "buffer", "cqi_pu")]
+    def __init__(self):
+        self.lib = lib = ctypes.CDLL(os.environ["BRANNOC_C_LIBRARY"])
+        u32 = ctypes.c_uint32
+        self.i32p, self.u8p = ctypes.POINTER(ctypes.c_int32), ctypes.POINTER(ctypes.c_uint8)
+        i32p, u8p = self.i32p, self.u8p
 
-    class Control(ctypes.Structure):
-        _fields_ = [(f.name, u32) for f in brannoc.SchControl.__dataclass_fields__.values()]
+        class Generics(ctypes.Structure):
+            _fields_ = [(n, u32) for n in ("pu", "alg", "buffer", "cqi_pu")]
 
-    class Inputs(ctypes.Structure):
-        _fields_ = [("llr", i32p), ("sys", i32p), ("p0", i32p), ("p1", i32p), ("llr_size", u32),
-                    ("harq_size", u32), ("control", Control)]
+        class Control(ctypes.Structure):
+            _fields_ = [(name, u32) for name in brannoc.SchControl.__dataclass_fields__]
 
-    class Outputs(ctypes.Structure):
-        _fields_ = [("data", u8p), ("ack", u8p), ("ri", u8p), ("cqi", u8p), ("sys", i32p),
-                    ("p0", i32p), ("p1", i32p), ("tb_err", ctypes.c_uint8), ("cw", u8p),
-                    ("cqi_err", ctypes.c_uint8), ("ack_err", ctypes.c_uint8),
-                    ("ri_err", ctypes.c_uint8)] + [(n, u32) for n in (
-                        "max_harq", "max_data", "max_ack", "max_ri", "max_cqi", "max_cw",
-                        "harq_size", "data_size", "ack_size", "ri_size", "cqi_size", "cw_size",
-                        "tag")]
+        class Inputs(ctypes.Structure):
+            _fields_ = [("llr", i32p), ("sys", i32p), ("p0", i32p), ("p1", i32p),
+                        ("llr_size", u32), ("harq_size", u32), ("control", Control)]
 
-    lib.vexlon_ip_brannoc_get_default_generics.restype = Generics
-    lib.vexlon_ip_brannoc_create_state.restype = ctypes.c_void_p
-    lib.vexlon_ip_brannoc_create_state.argtypes = [Generics]
-    lib.vexlon_ip_brannoc_SCH_bitacc_simulate.argtypes = [ctypes.c_void_p, Inputs,
-                                                           ctypes.POINTER(Outputs)]
-    lib.vexlon_ip_brannoc_destroy_state.argtypes = [ctypes.c_void_p]
-    state = lib.vexlon_ip_brannoc_create_state(lib.vexlon_ip_brannoc_get_default_generics())
-    c = sent.control
-    data = np.zeros(c.SCH_TBSIZE, np.uint8)
-    small = [np.zeros(64, np.uint8) for _ in range(4)]
-    harq = np.zeros((3, sent.harq_length), np.int32)
-    ptr = lambda a, t: a.ctypes.data_as(t)
-    inputs = Inputs(ptr(sent.llr, i32p), None, None, None, sent.llr.size, 0,
-                    Control(*[getattr(c, name) for name, _ in Control._fields_]))
-    outputs = Outputs(ptr(data, u8p), ptr(small[0], u8p), ptr(small[1], u8p), ptr(small[2], u8p),
-                      ptr(harq[0], i32p), ptr(harq[1], i32p), ptr(harq[2], i32p), 0,
-                      ptr(small[3], u8p), 0, 0, 0, sent.harq_length, c.SCH_TBSIZE, 64, 64, 64, 64)
-    assert lib.vexlon_ip_brannoc_SCH_bitacc_simulate(state, inputs, ctypes.byref(outputs)) == 0
-    lib.vexlon_ip_brannoc_destroy_state(state)
-    return data, harq, outputs.tb_err
+        class Outputs(ctypes.Structure):
+            _fields_ = [("data", u8p), ("ack", u8p), ("ri", u8p), ("cqi", u8p), ("sys", i32p),
+                        ("p0", i32p), ("p1", i32p), ("tb_err", ctypes.c_uint8), ("cw", u8p),
+                        ("cqi_err", ctypes.c_uint8), ("ack_err", ctypes.c_uint8),
+                        ("ri_err", ctypes.c_uint8)] + [(n, u32) for n in (
+                            "max_harq", "max_data", "max_ack", "max_ri", "max_cqi", "max_cw",
+                            "harq_size", "data_size", "ack_size", "ri_size", "cqi_size",
+                            "cw_size", "tag")]
+
+        self.Control, self.Inputs, self.Outputs = Control, Inputs, Outputs
+        lib.vexlon_ip_brannoc_get_default_generics.restype = Generics
+        lib.vexlon_ip_brannoc_create_state.restype = ctypes.c_void_p
+        lib.vexlon_ip_brannoc_create_state.argtypes = [Generics]
+        lib.vexlon_ip_brannoc_SCH_bitacc_simulate.argtypes = [ctypes.c_void_p, Inputs,
+                                                               ctypes.POINTER(Outputs)]
+        lib.vexlon_ip_brannoc_destroy_state.argtypes = [ctypes.c_void_p]
+        self.state = lib.vexlon_ip_brannoc_create_state(lib.vexlon_ip_brannoc_get_default_generics())
+
+    def __del__(self):
+        self.lib.vexlon_ip_brannoc_destroy_state(self.state)
+
+    def decode(self, sent):
+        """Data bits, HARQ buffers and transport-block flag of one new transmission."""
+        c = sent.control
+        data = np.zeros(c.SCH_TBSIZE, np.uint8)
+        small = [np.zeros(64, np.uint8) for _ in range(4)]
+        harq = np.zeros((3, sent.harq_length), np.int32)
+
+        def ptr(a, t):
+            return a.ctypes.data_as(t)
+
+        i32p, u8p = self.i32p, self.u8p
+        inputs = self.Inputs(ptr(sent.llr, i32p), None, None, None, sent.llr.size, 0,
+                             self.Control(*[getattr(c, name) for name, _ in self.Control._fields_]))
+        outputs = self.Outputs(ptr(data, u8p), ptr(small[0], u8p), ptr(small[1], u8p),
+                               ptr(small[2], u8p), ptr(harq[0], i32p), ptr(harq[1], i32p),
+                               ptr(harq[2], i32p), 0, ptr(small[3], u8p), 0, 0, 0,
+                               sent.harq_length, c.SCH_TBSIZE, 64, 64, 64, 64)
+        status = self.lib.vexlon_ip_brannoc_SCH_bitacc_simulate(self.state, inputs,
+                                                                ctypes.byref(outputs))
+        assert status == 0
+        return data, harq, outputs.tb_err
 
 
 def test_results_equal_the_c_interface_bit_for_bit():
     sent = tx.pusch(num_prb=20, qm=4, transport_block=8000, esn0_db=5.5, seed=9)
-    data, harq, tb_err = c_library_decode(sent)
+    data, harq, tb_err = CInterface().decode(sent)
     result = brannoc.Decoder().decode_sch(sent.llr, sent.control)
     assert same(result.transport_block, data) and np.array_equal(result.harq, harq)
     assert result.tb_crc_error == tb_err
