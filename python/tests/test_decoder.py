@@ -79,6 +79,7 @@ def test_every_error_path_raises_with_its_code_and_line():
     with pytest.raises(brannoc.BrannocError) as dump:
         decoder.set_dump(33, 0, "x_")
     assert dump.value.code == 0
+    sent.control.SCH_ND = 0
     with pytest.raises(ValueError):
         decoder.decode_sch(sent.llr, sent.control, harq=np.zeros((2, 5), dtype=np.int32))
     with pytest.raises(ValueError):
