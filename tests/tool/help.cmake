@@ -1,0 +1,11 @@
+# --version, and --help of the tool and of every subcommand.
+include(${CMAKE_CURRENT_LIST_DIR}/ToolTest.cmake)
+run_tool(out --version)
+expect_in("${out}" "^brannoc [0-9]+\\.[0-9]+\\.[0-9]+")
+run_tool(out --help)
+expect_in("${out}" "sim.*gen.*decode")
+foreach(command sim gen decode)
+  run_tool(out ${command} --help)
+  expect_in("${out}" "Usage: .*${command}")
+endforeach()
+run_tool(out sim --no-such-option EXPECT 109)
