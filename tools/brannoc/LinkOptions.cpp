@@ -68,18 +68,19 @@ std::vector<LinkOptions::Dimension> LinkOptions::dimensions() const {
   const auto generic = [](std::uint32_t vexlon_ip_brannoc_generics::*field) {
     return number([field](std::uint32_t v, D& d) { return (d.link.generics.*field = v, true); });
   };
-  const auto upTo = [](std::uint32_t sim::LinkConfig::*field, std::uint32_t most) {
-    return number([=](std::uint32_t v, D& d) { return (d.link.*field = v, v <= most); });
+  const auto within = [](std::uint32_t sim::LinkConfig::*field, std::uint32_t least,
+                          std::uint32_t most) {
+    return number([=](std::uint32_t v, D& d) { return (d.link.*field = v, v >= least && v <= most); });
   };
   return {
-      {"prb", &itsPrb, upTo(&sim::LinkConfig::numPrb, 110)},
+      {"prb", &itsPrb, within(&sim::LinkConfig::numPrb, 1, 110)},
       {"modulation", &itsModulation,
        [](const std::string& v, D& d) {
          d.link.Qm = v == "qpsk" ? 2 : v == "16qam" ? 4 : v == "64qam" ? 6 : 0;
          return d.link.Qm != 0;
        }},
       {"mcs", &itsMcs, number([](std::uint32_t v, D& d) { return (d.mcs = int(v), v <= 28); })},
-      {"tbs", &itsTbs, upTo(&sim::LinkConfig::tbSize, 262143)},
+      {"tbs", &itsTbs, within(&sim::LinkConfig::tbSize, 0, 262143)},
       {"cp", &itsCp,
        [](const std::string& v, D& d) {
          d.link.cp = v == "extended" ? tx::CyclicPrefix::Extended : tx::CyclicPrefix::Normal;
@@ -96,13 +97,13 @@ std::vector<LinkOptions::Dimension> LinkOptions::dimensions() const {
        }},
       {"max-tx", &itsMaxTx,
        number([](std::uint32_t v, D& d) { return (d.link.maxTransmissions = v, v >= 1 && v <= 16); })},
-      {"iterations", &itsIterations, upTo(&sim::LinkConfig::iterations, 15)},
+      {"iterations", &itsIterations, within(&sim::LinkConfig::iterations, 1, 15)},
       {"pu", &itsPu, generic(&vexlon_ip_brannoc_generics::C_NUM_PU)},
       {"algorithm", &itsAlgorithm, generic(&vexlon_ip_brannoc_generics::C_ALGORITHM_TYPE)},
       {"cqi-pu", &itsCqiPu, generic(&vexlon_ip_brannoc_generics::C_NUM_CQI_PU)},
-      {"cqi", &itsCqi, upTo(&sim::LinkConfig::cqiBits, 127)},
-      {"ack", &itsAck, upTo(&sim::LinkConfig::ackBits, 2)},
-      {"ri", &itsRi, upTo(&sim::LinkConfig::riBits, 2)},
+      {"cqi", &itsCqi, within(&sim::LinkConfig::cqiBits, 0, 127)},
+      {"ack", &itsAck, within(&sim::LinkConfig::ackBits, 0, 2)},
+      {"ri", &itsRi, within(&sim::LinkConfig::riBits, 0, 2)},
   };
 }
 
