@@ -117,7 +117,8 @@ class Reader {
     if (!header() || !channel(vector.channel)) return itsError;
     const std::vector<Entry> schema = schemaOf(vector.channel);
     std::map<std::string_view, Item> items;
-    const Entry* open = nullptr;  // the array being read
+    const Entry* open = nullptr;  // the array being read, and its values so far
+    std::vector<std::int32_t>* values = nullptr;
     std::uint32_t wanted = 0;
     std::vector<std::string_view> tokens;
     while (nextLine(tokens)) {
@@ -136,9 +137,13 @@ class Reader {
         std::uint32_t number = 0;
         const std::string what = entry->kind == Kind::Scalar ? "an unsigned 32-bit value"
                                                              : "the number of values";
-        if (tokens.size() != 2 || !parseNumber(tokens[1], number)) {
+        if (tokens.size() < 2 || !parseNumber(tokens[1], number)) {
           return fail("expected " + what + " after '" + std::string(entry->name) + "'" +
                       (tokens.size() < 2 ? std::string() : ", found " + quoted(tokens[1])));
+        }
+        if (tokens.size() > 2) {
+          return fail("expected the end of the line after '" + std::string(entry->name) + " " +
+                      std::string(tokens[1]) + "', found " + quoted(tokens[2]));
         }
         Item& item = items[entry->name];
         item.line = itsLine;
@@ -152,16 +157,17 @@ class Reader {
         }
         item.values.reserve(std::min<std::uint32_t>(number, 4096));
         open = &*entry;
+        values = &item.values;
         wanted = number;
         t = tokens.size();
       }
       for (; t < tokens.size(); ++t) {
-        if (!take(*open, tokens[t], wanted, items[open->name].values)) return itsError;
+        if (!take(*open, tokens[t], wanted, *values)) return itsError;
       }
-      if (items[open->name].values.size() == wanted) open = nullptr;
+      if (values->size() == wanted) open = nullptr;
     }
     if (open != nullptr) {
-      return fail("expected " + std::to_string(wanted - items[open->name].values.size()) +
+      return fail("expected " + std::to_string(wanted - values->size()) +
                   " more values of '" + std::string(open->name) + "' before the end of the file");
     }
     for (const Entry& entry : schema) {

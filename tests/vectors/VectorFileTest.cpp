@@ -72,6 +72,7 @@ TEST(VectorFile, MalformedLinesNameTheLineAndWhatWasExpected) {
       {"channel pucch", "channel pdsch", "2: expected 'channel pusch' or 'channel pucch'"},
       {"CCH_CP 0", "CCH_CP x", "8: expected an unsigned 32-bit value after 'CCH_CP', found 'x'"},
       {"CCH_CP 0", "CCH_CP", "8: expected an unsigned 32-bit value after 'CCH_CP'"},
+      {"CCH_CP 0", "CCH_CP 0 1", "8: expected the end of the line after 'CCH_CP 0', found '1'"},
       {"CCH_CP 0", "CCH_CP 4294967296", "8: expected an unsigned 32-bit value after 'CCH_CP', found '4294967296'"},
       {"CCH_CP 0", "SCH_CP 0", "8: expected a field name of a pucch vector, found 'SCH_CP'"},
       {"CCH_TAG 0", "CCH_CP 1", "11: 'CCH_CP' given a second time (first on line 8)"},
