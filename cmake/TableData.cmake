@@ -3,6 +3,8 @@
 # component that needs a table defines its own constant array and includes the rows:
 # the numbers have one source, and no component shares another's code.
 #
+# The Reed-Muller basis rows become {i, {M(i,0), M(i,1), ...}}, an index and an array.
+#
 # beta_offsets.csv holds decimals that are exact multiples of 1/8 and the word
 # "reserved": its rows become {"ACK", index, 8 * beta}, with 0 for a reserved entry.
 
@@ -51,8 +53,15 @@ function(brannoc_generate_table name)
           message(FATAL_ERROR "${name}.csv: '${cell}' is not an integer")
         endif()
       endforeach()
-      string(REPLACE ";" ", " row "${cells}")
-      string(APPEND body "{${row}},\n")
+      if(name MATCHES "^rm_")
+        # Reed-Muller basis rows: the row index, then the basis bits as one array.
+        list(POP_FRONT cells index)
+        string(REPLACE ";" ", " row "${cells}")
+        string(APPEND body "{${index}, {${row}}},\n")
+      else()
+        string(REPLACE ";" ", " row "${cells}")
+        string(APPEND body "{${row}},\n")
+      endif()
     endif()
   endforeach()
   file(CONFIGURE OUTPUT ${inc} CONTENT "${body}")

@@ -2,12 +2,14 @@
 // (TS 36.212 clause 5.1.3.2 code, decoded by the BCJR algorithm in the log domain): the
 // constituent decoder is one recursion body templated on one of these policies.
 //
-// Units: one raw 8:5 soft-value step. The log-MAP correction assumes soft values scaled as
-// 8 raw steps per natural-log unit of likelihood ratio (raw = round(8 * ln(P(1)/P(0)))).
-// Max-log-MAP, scaled or not, does not depend on that scale.
+// Units: one raw soft-value step. A soft value of v raw steps stands for the log-likelihood
+// ratio ln(P(1)/P(0)) = v / s, s being the steps per natural-log unit (generics word 5;
+// 32 by default, the 8:5 format's 1.0). Only the log-MAP correction depends on s; max-log-MAP,
+// scaled or not, is the same at every scale.
 #ifndef CORVANE_METRICPOLICIES_H
 #define CORVANE_METRICPOLICIES_H
 
+#include <array>
 #include <cstdint>
 
 namespace corvane {
@@ -29,17 +31,38 @@ struct ScaledMaxLogPolicy {
   }
 };
 
-// Log-MAP: max*(a, b) = max(a, b) + ln(1 + e^-|a-b|), the correction read from a table in
-// raw steps (8 per natural-log unit): entry d is round(8 * ln(1 + e^(-d/8))), and is 0 from
-// d = 22 on.
+// The log-MAP correction ln(1 + e^-x) in raw steps at s steps per natural-log unit: entry d
+// is round(s * ln(1 + e^(-d/s))), up to and including the first entry that is 0 (every
+// larger difference also gets 0). The entries are evaluated once, in integer fixed point
+// (30 fraction bits), so every build makes the same table; the largest, round(s * ln 2),
+// is 22 at s = 32 and 44 at s = 64.
+class CorrectionTable {
+ public:
+  static constexpr std::uint32_t kMinStepsPerUnit = 1;
+  static constexpr std::uint32_t kMaxStepsPerUnit = 64;
+  static constexpr int kMaxSize = 320;  // 312 entries at s = 64
+
+  // A table for stepsPerUnit in kMinStepsPerUnit..kMaxStepsPerUnit.
+  explicit CorrectionTable(std::uint32_t stepsPerUnit = 32);
+
+  int size() const { return itsSize; }
+  int operator[](int d) const { return itsEntries[static_cast<std::size_t>(d)]; }
+  // The correction of a difference d >= 0.
+  int correction(int d) const {
+    return itsEntries[static_cast<std::size_t>(d < itsSize ? d : itsSize - 1)];
+  }
+
+ private:
+  std::array<std::uint8_t, kMaxSize> itsEntries{};
+  int itsSize = 0;
+};
+
+// Log-MAP: max*(a, b) = max(a, b) + ln(1 + e^-|a-b|), the correction read from the table.
 struct LogMapPolicy {
-  static constexpr int kCorrectionSize = 23;
-  static constexpr std::int8_t kCorrection[kCorrectionSize] = {
-      6, 5, 5, 4, 4, 3, 3, 3, 3, 2, 2, 2, 2, 1, 1, 1, 1, 1, 1, 1, 1, 1, 0};
-  static int combine(int a, int b) {
+  const CorrectionTable* table;
+  int combine(int a, int b) const {
     const int difference = a > b ? a - b : b - a;
-    const int index = difference < kCorrectionSize - 1 ? difference : kCorrectionSize - 1;
-    return (a > b ? a : b) + kCorrection[index];
+    return (a > b ? a : b) + table->correction(difference);
   }
   static int scaleExtrinsic(int e) { return e; }
 };

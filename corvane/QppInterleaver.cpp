@@ -19,9 +19,8 @@ static_assert(kQppTable[std::size(kQppTable) - 1].K == kMaxBlockSize);
 }  // namespace
 
 const QppRow* findQppRow(std::uint32_t K) {
-  const QppRow* row = std::lower_bound(
-      std::begin(kQppTable), std::end(kQppTable), K,
-      [](const QppRow& r, std::uint32_t k) { return r.K < k; });
+  const QppRow* row = std::lower_bound(std::begin(kQppTable), std::end(kQppTable), K,
+                                       [](const QppRow& r, std::uint32_t k) { return r.K < k; });
   return (row != std::end(kQppTable) && row->K == K) ? row : nullptr;
 }
 

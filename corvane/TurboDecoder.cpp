@@ -7,24 +7,31 @@
 #include <algorithm>
 #include <new>
 
-#include "MetricPolicies.h"
-
 namespace corvane {
 
-namespace {
-
-// Received soft values are 8-bit: anything outside -128..127 is saturated.
-Metric softValue(std::int32_t value) {
-  return static_cast<Metric>(std::clamp<std::int32_t>(value, -128, 127));
+void tailBetas(const CodeBlock& block, StateMetrics (&betas)[2]) {
+  // The tail of clause 5.1.3.2.2: x_K, z_K, x_K+1, z_K+1, x_K+2, z_K+2 of the first encoder
+  // and the primed values of the second spread over d0, d1, d2 at K..K+3.
+  const std::uint32_t K = block.row->K;
+  const std::int32_t* d0 = block.d0;
+  const std::int32_t* d1 = block.d1;
+  const std::int32_t* d2 = block.d2;
+  const int tailX1[3] = {softValue(d0[K]), softValue(d2[K]), softValue(d1[K + 1])};
+  const int tailZ1[3] = {softValue(d1[K]), softValue(d0[K + 1]), softValue(d2[K + 1])};
+  const int tailX2[3] = {softValue(d0[K + 2]), softValue(d2[K + 2]), softValue(d1[K + 3])};
+  const int tailZ2[3] = {softValue(d1[K + 2]), softValue(d0[K + 3]), softValue(d2[K + 3])};
+  betas[0] = terminatedBeta(tailX1, tailZ1);
+  betas[1] = terminatedBeta(tailX2, tailZ2);
 }
-
-}  // namespace
 
 bool isValidConfig(const DecoderConfig& config) {
   const std::uint32_t P = config.processingUnits;
   return findQppRow(config.maxBlockSize) != nullptr && (P == 1 || P == 2 || P == 4 || P == 8) &&
          static_cast<std::uint32_t>(config.algorithm) <= 2 &&
-         config.extrinsicBits >= kMinExtrinsicBits && config.extrinsicBits <= kMaxExtrinsicBits;
+         config.extrinsicBits >= kMinExtrinsicBits && config.extrinsicBits <= kMaxExtrinsicBits &&
+         config.stepsPerUnit >= CorrectionTable::kMinStepsPerUnit &&
+         config.stepsPerUnit <= CorrectionTable::kMaxStepsPerUnit && config.maxCodeBlocks >= 1 &&
+         config.maxCodeBlocks <= kMaxCodeBlocks;
 }
 
 bool TurboDecoder::init(const DecoderConfig& config) {
@@ -32,6 +39,7 @@ bool TurboDecoder::init(const DecoderConfig& config) {
     return false;
   }
   itsConfig = config;
+  itsCorrection = CorrectionTable(config.stepsPerUnit);
   itsExtrinsicLimit = (1 << (config.extrinsicBits - 1)) - 1;
   const std::size_t K = config.maxBlockSize;
   try {
@@ -50,10 +58,12 @@ bool TurboDecoder::init(const DecoderConfig& config) {
   return true;
 }
 
-void TurboDecoder::decode(const QppRow& row, const std::int32_t* d0, const std::int32_t* d1,
-                          const std::int32_t* d2, std::uint32_t iterations, std::uint8_t* bits) {
-  const std::uint32_t K = row.K;
-  buildQppPermutation(row, itsPi.data());
+void TurboDecoder::decode(const CodeBlock& block) {
+  const std::uint32_t K = block.row->K;
+  const std::int32_t* d0 = block.d0;
+  const std::int32_t* d1 = block.d1;
+  const std::int32_t* d2 = block.d2;
+  buildQppPermutation(*block.row, itsPi.data());
   for (std::uint32_t k = 0; k < K; ++k) {
     itsSystematic[k] = softValue(d0[k]);
     itsParity1[k] = softValue(d1[k]);
@@ -62,27 +72,20 @@ void TurboDecoder::decode(const QppRow& row, const std::int32_t* d0, const std::
   for (std::uint32_t i = 0; i < K; ++i) {
     itsSystematicInterleaved[i] = itsSystematic[itsPi[i]];
   }
-  // The tail of clause 5.1.3.2.2: x_K, z_K, x_K+1, z_K+1, x_K+2, z_K+2 of the first encoder
-  // and the primed values of the second spread over d0, d1, d2 at K..K+3.
-  const int tailX1[3] = {softValue(d0[K]), softValue(d2[K]), softValue(d1[K + 1])};
-  const int tailZ1[3] = {softValue(d1[K]), softValue(d0[K + 1]), softValue(d2[K + 1])};
-  const int tailX2[3] = {softValue(d0[K + 2]), softValue(d2[K + 2]), softValue(d1[K + 3])};
-  const int tailZ2[3] = {softValue(d1[K + 2]), softValue(d0[K + 3]), softValue(d2[K + 3])};
-  itsTailBeta[0] = terminatedBeta(tailX1, tailZ1);
-  itsTailBeta[1] = terminatedBeta(tailX2, tailZ2);
+  tailBetas(block, itsTailBeta);
   // Window boundaries start equiprobable in the first iteration.
   for (Boundaries& boundaries : itsBoundaries) {
     boundaries = Boundaries{};
   }
   switch (itsConfig.algorithm) {
     case Algorithm::MaxLog:
-      iterate<MaxLogPolicy>(K, iterations, bits);
+      iterate(MaxLogPolicy{}, K, block.iterations, block.bits);
       break;
     case Algorithm::ScaledMaxLog:
-      iterate<ScaledMaxLogPolicy>(K, iterations, bits);
+      iterate(ScaledMaxLogPolicy{}, K, block.iterations, block.bits);
       break;
     case Algorithm::LogMap:
-      iterate<LogMapPolicy>(K, iterations, bits);
+      iterate(LogMapPolicy{&itsCorrection}, K, block.iterations, block.bits);
       break;
   }
 }
@@ -93,7 +96,8 @@ int TurboDecoder::aPriori(int rawExtrinsic) const {
 }
 
 template <class Policy>
-void TurboDecoder::iterate(std::uint32_t K, std::uint32_t iterations, std::uint8_t* bits) {
+void TurboDecoder::iterate(const Policy& policy, std::uint32_t K, std::uint32_t iterations,
+                           std::uint8_t* bits) {
   const std::uint16_t* pi = itsPi.data();
   Metric* aPrioriValues = itsAPriori.data();
   Metric* lu = itsLu.data();
@@ -104,8 +108,7 @@ void TurboDecoder::iterate(std::uint32_t K, std::uint32_t iterations, std::uint8
     for (std::uint32_t k = 0; k < K; ++k) {
       lu[k] = static_cast<Metric>(itsSystematic[k] + aPrioriValues[k]);
     }
-    halfIteration<Policy>(static_cast<int>(K), itsParity1.data(), itsTailBeta[0],
-                          itsBoundaries[0]);
+    halfIteration(policy, static_cast<int>(K), itsParity1.data(), itsTailBeta[0], itsBoundaries[0]);
     for (std::uint32_t i = 0; i < K; ++i) {
       aPrioriValues[i] = static_cast<Metric>(aPriori<Policy>(extrinsic[pi[i]]));
     }
@@ -113,8 +116,7 @@ void TurboDecoder::iterate(std::uint32_t K, std::uint32_t iterations, std::uint8
     for (std::uint32_t i = 0; i < K; ++i) {
       lu[i] = static_cast<Metric>(itsSystematicInterleaved[i] + aPrioriValues[i]);
     }
-    halfIteration<Policy>(static_cast<int>(K), itsParity2.data(), itsTailBeta[1],
-                          itsBoundaries[1]);
+    halfIteration(policy, static_cast<int>(K), itsParity2.data(), itsTailBeta[1], itsBoundaries[1]);
     if (iteration + 1 < iterations) {
       for (std::uint32_t i = 0; i < K; ++i) {
         aPrioriValues[pi[i]] = static_cast<Metric>(aPriori<Policy>(extrinsic[i]));
@@ -128,8 +130,8 @@ void TurboDecoder::iterate(std::uint32_t K, std::uint32_t iterations, std::uint8
 }
 
 template <class Policy>
-void TurboDecoder::halfIteration(int K, const Metric* parity, const StateMetrics& tailBeta,
-                                 Boundaries& boundaries) {
+void TurboDecoder::halfIteration(const Policy& policy, int K, const Metric* parity,
+                                 const StateMetrics& tailBeta, Boundaries& boundaries) {
   const int P = static_cast<int>(itsConfig.processingUnits);
   const int length = K / P;  // every K of the table is a multiple of 8
   // The windows are independent within a half-iteration: each starts from the boundary
@@ -139,8 +141,8 @@ void TurboDecoder::halfIteration(int K, const Metric* parity, const StateMetrics
     const StateMetrics& alphaStart = w == 0 ? knownStateZero() : boundaries.alpha[w];
     const StateMetrics& betaEnd = w == P - 1 ? tailBeta : boundaries.beta[w + 1];
     const int first = w * length;
-    decodeWindow<Policy>(itsLu.data() + first, parity + first, length, alphaStart, betaEnd,
-                         itsAlpha.data(), reached.beta[w], itsExtrinsic.data() + first);
+    decodeWindow(policy, itsLu.data() + first, parity + first, length, alphaStart, betaEnd,
+                 itsAlpha.data(), reached.beta[w], itsExtrinsic.data() + first);
     reached.alpha[w + 1] = itsAlpha[length];
   }
   for (int t = 1; t < P; ++t) {

@@ -9,7 +9,8 @@
  * instance at the end.
  *
  * Soft values (LLRs and HARQ buffers) are signed 32-bit integers holding raw 8:5
- * fixed-point values (-128..127, 32 = 1.0); a value of 0 or more stands for bit 1, a
+ * fixed-point values (-128..127, 32 = 1.0): a value v is the log-likelihood ratio
+ * ln(P(bit 1) / P(bit 0)) = v / 32 in natural-log units, so 0 or more stands for bit 1 and a
  * negative value for bit 0. Decoded bits are one bit (0 or 1) per byte.
  *
  * The records below are the contract of the library: field order and widths are binding,

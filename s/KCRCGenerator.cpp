@@ -1,6 +1,10 @@
 // KCRCGenerator: CRC generation and checking of TS 36.212 clause 5.1.1.
 #include "KCRCGenerator.h"
 
+#include <algorithm>
+#include <bit>
+#include <cstring>
+
 #include "errorLine.h"
 
 namespace brannoc {
@@ -36,17 +40,35 @@ void KCRCGenerator::setPolynomial(std::uint32_t length, std::initializer_list<st
   }
 }
 
+namespace {
+
+// Eight one-bit elements (their low bits) as one byte, the first element the most significant
+// bit: a little-endian load moves element j to bit 8j, and the multiplication gathers bit 8j
+// to bit 63 - j.
+std::uint32_t packEight(const std::uint8_t* bits) {
+  if constexpr (std::endian::native == std::endian::little) {
+    std::uint64_t word;
+    std::memcpy(&word, bits, sizeof word);
+    return static_cast<std::uint32_t>(((word & 0x0101010101010101ULL) * 0x8040201008040201ULL) >>
+                                      56);
+  } else {
+    std::uint32_t byte = 0;
+    for (int k = 0; k < 8; ++k) {
+      byte = (byte << 1) | (bits[k] & 1U);
+    }
+    return byte;
+  }
+}
+
+}  // namespace
+
 std::uint32_t KCRCGenerator::remainder(const std::uint8_t* bits, std::size_t n) const {
   const std::uint32_t L = itsLength;
   const std::uint32_t mask = L == 32 ? 0xFFFFFFFFU : (1U << L) - 1U;
   std::uint32_t reg = 0;
   std::size_t i = 0;
   for (; i + 8 <= n; i += 8) {
-    std::uint32_t byte = 0;
-    for (std::size_t k = 0; k < 8; ++k) {
-      byte = (byte << 1) | (bits[i + k] & 1U);
-    }
-    reg = ((reg << 8) & mask) ^ itsByteTable[((reg >> (L - 8)) ^ byte) & 0xFFU];
+    reg = ((reg << 8) & mask) ^ itsByteTable[((reg >> (L - 8)) ^ packEight(bits + i)) & 0xFFU];
   }
   for (; i < n; ++i) {
     const bool feedback = (((reg >> (L - 1)) ^ bits[i]) & 1U) != 0;
@@ -103,14 +125,16 @@ bool KCRCGenerator::check(const std::vector<std::uint8_t>& codedBits,
   // The received parity must equal the one generated from the received data; the data bits
   // themselves are compared as generate writes them (their low bit).
   const std::uint32_t parity = remainder(codedBits.data(), n);
-  bool pass = true;
-  for (std::size_t i = 0; i < n && pass; ++i) {
-    pass = codedBits[i] <= 1;
+  // An element other than 0 or 1 is not the bit generate would have written there.
+  const bool pass =
+      std::all_of(codedBits.begin(), codedBits.begin() + static_cast<std::ptrdiff_t>(n),
+                  [](std::uint8_t b) { return b <= 1; });
+  bool parityMatches = true;
+  for (std::uint32_t i = 0; i < L; ++i) {
+    parityMatches =
+        parityMatches && codedBits[n + i] == (((parity >> (L - 1 - i)) ^ (crcMask >> i)) & 1U);
   }
-  for (std::uint32_t i = 0; i < L && pass; ++i) {
-    pass = codedBits[n + i] == (((parity >> (L - 1 - i)) ^ (crcMask >> i)) & 1U);
-  }
-  crcPass = pass ? 1 : 0;
+  crcPass = pass && parityMatches ? 1 : 0;
   return true;
 }
 

@@ -719,6 +719,14 @@ bool KLTE_PUSCH_Decoding::applyHARQCodeBlocks(const std::vector<Streams>& harqBl
 
 bool KLTE_PUSCH_Decoding::turboDecodeCodeBlocks(const std::vector<Streams>& combined,
                                                 std::vector<Bits>& decoded) {
+  // The blocks go to the model in batches; turboDecodeCodeBlock, one block at a time, is the
+  // path for blocks whose streams differ in length (never so for dematched blocks).
+  const bool sameLengths = std::all_of(combined.begin(), combined.end(), [](const Streams& s) {
+    return s.size() == 3 && s[1].size() == s[0].size() && s[2].size() == s[0].size();
+  });
+  if (sameLengths) {
+    return itsTurboDecoder.decodeBlocks(combined, decoded, itsTurboIterations);
+  }
   bool ok = true;
   for (std::size_t r = 0; r < combined.size(); ++r) {
     ok = turboDecodeCodeBlock(combined[r], decoded[r], itsTurboIterations) && ok;

@@ -234,6 +234,18 @@ bool KRateDeMatch::rateDematchData(std::span<const std::int32_t> in, Streams& ou
   const std::size_t count = map->position.size();
   std::size_t n = static_cast<std::size_t>(
       std::lower_bound(map->position.begin(), map->position.end(), k0) - map->position.begin());
+  if (in.size() <= count) {
+    // Each position is met once at most, onto its 0: the sum is the soft value saturated.
+    for (const std::int32_t value : in) {
+      if (n == count) {
+        n = 0;
+      }
+      const std::uint32_t target = map->target[n++];
+      streams[target >> kStreamShift][target & kIndexMask] =
+          static_cast<std::int32_t>(std::clamp<std::int64_t>(value, minQ, maxQ));
+    }
+    return true;
+  }
   for (const std::int32_t value : in) {
     if (n == count) {
       n = 0;

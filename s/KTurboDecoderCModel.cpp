@@ -3,6 +3,7 @@
 // from the C allocator, which the library reads, and released before return.
 #include "KTurboDecoderCModel.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 #include <utility>
@@ -41,7 +42,17 @@ struct ModelArrays {
 
 }  // namespace
 
-KTurboDecoderCModel::KTurboDecoderCModel() : itsGenerics(vexlon_ip_corvane_get_default_generics()) {
+namespace {
+
+vexlon_ip_corvane_generics batchGenerics() {
+  vexlon_ip_corvane_generics generics = vexlon_ip_corvane_get_default_generics();
+  generics.max_code_blocks = KTurboDecoderCModel::kBatchBlocks;
+  return generics;
+}
+
+}  // namespace
+
+KTurboDecoderCModel::KTurboDecoderCModel() : itsGenerics(batchGenerics()) {
   itsModel = vexlon_ip_corvane_create_state(itsGenerics);
   if (itsModel == nullptr) {
     errorLineFile(kSource, 84, kCouldNotCreate);
@@ -90,19 +101,25 @@ bool KTurboDecoderCModel::createModel(const vexlon_ip_corvane_generics& generics
   return true;
 }
 
-bool KTurboDecoderCModel::setNumPU(std::uint32_t numPU) {
-  itsGenerics.processing_units = numPU;
+bool KTurboDecoderCModel::setWord(std::uint32_t vexlon_ip_corvane_generics::*word,
+                                  std::uint32_t value) {
+  if (itsModel != nullptr && itsGenerics.*word == value) {
+    return true;
+  }
+  itsGenerics.*word = value;
   return createModel(itsGenerics);
+}
+
+bool KTurboDecoderCModel::setNumPU(std::uint32_t numPU) {
+  return setWord(&vexlon_ip_corvane_generics::processing_units, numPU);
 }
 
 bool KTurboDecoderCModel::setAlgorithmType(std::uint32_t type) {
-  itsGenerics.algorithm = type;
-  return createModel(itsGenerics);
+  return setWord(&vexlon_ip_corvane_generics::algorithm, type);
 }
 
 bool KTurboDecoderCModel::setExtrinsicBits(std::uint32_t bits) {
-  itsGenerics.extrinsic_bits = bits;
-  return createModel(itsGenerics);
+  return setWord(&vexlon_ip_corvane_generics::extrinsic_bits, bits);
 }
 
 std::int32_t KTurboDecoderCModel::destroyModel() {
@@ -165,6 +182,68 @@ bool KTurboDecoderCModel::decode(const std::vector<std::int32_t>& sys,
   const std::uint32_t stored = outputs.bits_stored <= K ? outputs.bits_stored : K;
   out.assign(arrays.bits, arrays.bits + stored);
   return true;
+}
+
+bool KTurboDecoderCModel::decodeBlocks(
+    const std::vector<std::vector<std::vector<std::int32_t>>>& blocks,
+    std::vector<std::vector<std::uint8_t>>& out, std::uint32_t iterations) {
+  out.resize(blocks.size());
+  const auto alone = [&](std::size_t first, std::size_t last) {
+    bool ok = true;
+    for (std::size_t i = first; i < last; ++i) {
+      ok = decode(blocks[i][0], blocks[i][1], blocks[i][2], out[i], iterations) && ok;
+    }
+    return ok;
+  };
+  const std::size_t batch = std::max<std::uint32_t>(itsGenerics.max_code_blocks, 1);
+  const bool threeStreams = std::all_of(blocks.begin(), blocks.end(),
+                                        [](const auto& streams) { return streams.size() == 3; });
+  if (itsModel == nullptr || batch == 1 || !threeStreams) {
+    return alone(0, blocks.size());
+  }
+  bool ok = true;
+  std::vector<vexlon_ip_corvane_inputs> inputs;
+  std::vector<vexlon_ip_corvane_outputs> outputs;
+  for (std::size_t first = 0; first < blocks.size(); first += batch) {
+    const std::size_t last = std::min(first + batch, blocks.size());
+    inputs.assign(last - first, vexlon_ip_corvane_inputs{});
+    outputs.assign(last - first, vexlon_ip_corvane_outputs{});
+    std::size_t bits = 0;
+    for (std::size_t i = first; i < last; ++i) {
+      bits += blocks[i][0].size();
+    }
+    itsBits.resize(bits);
+    std::size_t offset = 0;
+    for (std::size_t i = first; i < last; ++i) {
+      // The model checks every length; a block it refuses sends the whole batch below.
+      const std::vector<std::vector<std::int32_t>>& streams = blocks[i];
+      const auto N = static_cast<std::uint32_t>(streams[0].size());
+      vexlon_ip_corvane_inputs& in = inputs[i - first];
+      in.block_size = N >= 4 ? N - 4 : 0;
+      in.iterations = iterations;
+      in.num_code_blocks = 1;
+      in.systematic = streams[0].data();
+      in.systematic_size = N;
+      in.parity_1 = streams[1].data();
+      in.parity_1_size = static_cast<std::uint32_t>(streams[1].size());
+      in.parity_2 = streams[2].data();
+      in.parity_2_size = static_cast<std::uint32_t>(streams[2].size());
+      outputs[i - first].bits = itsBits.data() + offset;
+      outputs[i - first].bits_capacity = in.block_size;
+      offset += N;
+    }
+    const std::int32_t code = vexlon_ip_corvane_bitacc_simulate_batch(
+        itsModel, inputs.data(), static_cast<std::uint32_t>(inputs.size()), outputs.data());
+    if (code != 0) {
+      ok = alone(first, last) && ok;  // each block then says what is wrong with it
+      continue;
+    }
+    for (std::size_t i = first; i < last; ++i) {
+      const vexlon_ip_corvane_outputs& o = outputs[i - first];
+      out[i].assign(o.bits, o.bits + std::min(o.bits_stored, o.bits_capacity));
+    }
+  }
+  return ok;
 }
 
 }  // namespace brannoc

@@ -4,8 +4,8 @@
 # bler.csv, bler.json and bler.png go to results/. Extra arguments go to `brannoc sim`.
 set -euo pipefail
 cd "$(dirname "$0")/.."
-scripts/install-packages.sh g++ cmake make googletest libbenchmark-dev libcli11-dev libfmt-dev \
-  nlohmann-json3-dev python3-matplotlib
+scripts/install-packages.sh g++ cmake make googletest libbenchmark-dev libhwy-dev libcli11-dev \
+  libfmt-dev nlohmann-json3-dev python3-matplotlib
 cmake --preset release >/dev/null
 cmake --build --preset release -j "$(nproc)" --target brannoc
 build/release/tools/brannoc/brannoc sim --out results "$@"

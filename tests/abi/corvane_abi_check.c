@@ -12,11 +12,13 @@ static void check_records(void) {
   typedef vexlon_ip_corvane_inputs I;
   typedef vexlon_ip_corvane_outputs O;
   const struct abi_field generics[] = {
-      WORD(G, max_block_size),   WORD(G, reserved_1),  WORD(G, reserved_2),  WORD(G, reserved_3),
-      WORD(G, processing_units), WORD(G, reserved_5),  WORD(G, reserved_6),  WORD(G, algorithm),
-      WORD(G, extrinsic_bits),   WORD(G, reserved_9),  WORD(G, reserved_10), WORD(G, reserved_11),
-      WORD(G, reserved_12),      WORD(G, reserved_13), WORD(G, reserved_14), WORD(G, reserved_15),
-      WORD(G, reserved_16),      WORD(G, reserved_17), WORD(G, reserved_18)};
+      WORD(G, max_block_size),  WORD(G, reserved_1),       WORD(G, reserved_2),
+      WORD(G, reserved_3),      WORD(G, processing_units), WORD(G, steps_per_unit),
+      WORD(G, decoder_path),    WORD(G, algorithm),        WORD(G, extrinsic_bits),
+      WORD(G, max_code_blocks), WORD(G, reserved_10),      WORD(G, reserved_11),
+      WORD(G, reserved_12),     WORD(G, reserved_13),      WORD(G, reserved_14),
+      WORD(G, reserved_15),     WORD(G, reserved_16),      WORD(G, reserved_17),
+      WORD(G, reserved_18)};
   const struct abi_field inputs[] = {
       WORD(I, block_size),    WORD(I, iterations),    WORD(I, num_code_blocks),
       WORD(I, reserved_3),    PTR(I, systematic),     WORD(I, systematic_size),
@@ -34,7 +36,9 @@ int main(void) {
   vexlon_ip_corvane_state *state = vexlon_ip_corvane_create_state(generics);
   check_records();
   expect_call(generics.processing_units == 2 && generics.algorithm == 1 &&
-                  generics.max_block_size == 6144 && generics.extrinsic_bits == 10,
+                  generics.max_block_size == 6144 && generics.extrinsic_bits == 10 &&
+                  generics.steps_per_unit == 32 && generics.decoder_path == 0 &&
+                  generics.max_code_blocks == 1,
               "default generics are wrong");
   expect_call(state != NULL && vexlon_ip_corvane_destroy_state(state) == 0,
               "the default generics give no state");

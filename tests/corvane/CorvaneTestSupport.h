@@ -3,6 +3,7 @@
 #ifndef CORVANE_TESTS_CORVANETESTSUPPORT_H
 #define CORVANE_TESTS_CORVANETESTSUPPORT_H
 
+#include <algorithm>
 #include <cstdint>
 #include <vector>
 
@@ -83,6 +84,33 @@ inline std::vector<std::uint8_t> randomBits(SplitMix64& rng, std::uint32_t K) {
   std::vector<std::uint8_t> c(K);
   for (std::uint8_t& bit : c) bit = static_cast<std::uint8_t>(rng.next() >> 63);
   return c;
+}
+
+// Soft values of a BPSK-like channel made with integers only: amplitude +-mean plus
+// approximately Gaussian noise, the centred sum of four uniform 16-bit values (standard
+// deviation 65536 / sqrt(3)) times spread / 65536, saturated to 8 bits. The standard
+// deviation in raw steps is about 0.577 * spread.
+inline std::vector<std::int32_t> noisy(const brannoc::tx::Bits& bits, SplitMix64& rng,
+                                       std::int32_t mean, std::int64_t spread) {
+  std::vector<std::int32_t> soft(bits.size());
+  for (std::size_t n = 0; n < bits.size(); ++n) {
+    const std::uint64_t r = rng.next();
+    const std::int64_t sum = static_cast<std::int64_t>(r & 0xFFFF) + ((r >> 16) & 0xFFFF) +
+                             ((r >> 32) & 0xFFFF) + (r >> 48);
+    const std::int64_t noise = ((sum - 2 * 65535) * spread) >> 16;
+    const std::int64_t value = (bits[n] != 0 ? mean : -mean) + noise;
+    soft[n] = static_cast<std::int32_t>(std::clamp<std::int64_t>(value, -128, 127));
+  }
+  return soft;
+}
+
+inline SoftStreams noisyStreams(const brannoc::tx::TurboCodeword& d, SplitMix64& rng,
+                                std::int32_t mean, std::int64_t spread) {
+  SoftStreams s;
+  s.d0 = noisy(d.d0, rng, mean, spread);
+  s.d1 = noisy(d.d1, rng, mean, spread);
+  s.d2 = noisy(d.d2, rng, mean, spread);
+  return s;
 }
 
 // The transmitter's codeword of c.

@@ -9,7 +9,9 @@
 #include <vector>
 
 #include "CorvaneTestSupport.h"
+#include "MetricPolicies.h"
 #include "QppInterleaver.h"
+#include "VectorDecoder.h"
 
 namespace corvane::test {
 namespace {
@@ -20,6 +22,9 @@ TEST(CorvaneGenerics, DefaultsAndRefusedValues) {
   EXPECT_EQ(defaults.processing_units, 2u);
   EXPECT_EQ(defaults.algorithm, 1u);
   EXPECT_EQ(defaults.extrinsic_bits, 10u);
+  EXPECT_EQ(defaults.steps_per_unit, 32u);
+  EXPECT_EQ(defaults.decoder_path, 0u);
+  EXPECT_EQ(defaults.max_code_blocks, 1u);
 
   struct Case {
     const char* name;
@@ -43,8 +48,18 @@ TEST(CorvaneGenerics, DefaultsAndRefusedValues) {
       {"extrinsic 11", [](auto& g) { g.extrinsic_bits = 11; }, true},
       {"extrinsic 7", [](auto& g) { g.extrinsic_bits = 7; }, false},
       {"extrinsic 12", [](auto& g) { g.extrinsic_bits = 12; }, false},
+      {"steps 0 (default)", [](auto& g) { g.steps_per_unit = 0; }, true},
+      {"steps 4", [](auto& g) { g.steps_per_unit = 4; }, true},
+      {"steps 64", [](auto& g) { g.steps_per_unit = 64; }, true},
+      {"steps 65", [](auto& g) { g.steps_per_unit = 65; }, false},
+      {"scalar path", [](auto& g) { g.decoder_path = 1; }, true},
+      {"vectorised path", [](auto& g) { g.decoder_path = 2; }, vectorDecoderAvailable()},
+      {"path 3", [](auto& g) { g.decoder_path = 3; }, false},
+      {"blocks 0 (default)", [](auto& g) { g.max_code_blocks = 0; }, true},
+      {"blocks 32", [](auto& g) { g.max_code_blocks = 32; }, true},
+      {"blocks 33", [](auto& g) { g.max_code_blocks = 33; }, false},
       {"reserved 1", [](auto& g) { g.reserved_1 = 1; }, false},
-      {"reserved 6", [](auto& g) { g.reserved_6 = 1; }, false},
+      {"reserved 10", [](auto& g) { g.reserved_10 = 1; }, false},
       {"reserved 18", [](auto& g) { g.reserved_18 = 0x80000000u; }, false},
   };
   for (const Case& c : cases) {
@@ -109,11 +124,15 @@ TEST(CorvaneSimulate, RefusedCallsReturnTheirStatusAndWriteNoBits) {
          in.systematic_size = 45;
        },
        VEXLON_IP_CORVANE_BAD_STREAM_SIZE},
-      {"d1 K + 3", [&](auto& in, auto&) { in.parity_1 = stream43.data(); in.parity_1_size = 43; },
+      {"d1 K + 3",
+       [&](auto& in, auto&) {
+         in.parity_1 = stream43.data();
+         in.parity_1_size = 43;
+       },
        VEXLON_IP_CORVANE_BAD_STREAM_SIZE},
       {"d2 0", [](auto& in, auto&) { in.parity_2_size = 0; }, VEXLON_IP_CORVANE_BAD_STREAM_SIZE},
-      {"all streams K", [](auto& in, auto&) {
-         in.systematic_size = in.parity_1_size = in.parity_2_size = 40; },
+      {"all streams K",
+       [](auto& in, auto&) { in.systematic_size = in.parity_1_size = in.parity_2_size = 40; },
        VEXLON_IP_CORVANE_BAD_STREAM_SIZE},
       {"null bits", [](auto&, auto& out) { out.bits = nullptr; }, VEXLON_IP_CORVANE_NULL_BITS},
       {"capacity K - 1", [](auto&, auto& out) { out.bits_capacity = 39; },
@@ -147,13 +166,78 @@ TEST(CorvaneSimulate, RefusedCallsReturnTheirStatusAndWriteNoBits) {
   // The base case of the table is a valid call.
   std::vector<std::uint8_t> bits(64, 0xEE);
   vexlon_ip_corvane_outputs out{0, 0, bits.data(), 40};
-  vexlon_ip_corvane_inputs in{40, 16, 1, 0, stream44.data(), 44, stream44.data(), 44,
-                              stream44.data(), 44, 0, 0};
+  vexlon_ip_corvane_inputs in{
+      40, 16, 1, 0, stream44.data(), 44, stream44.data(), 44, stream44.data(), 44, 0, 0};
   ASSERT_EQ(vexlon_ip_corvane_bitacc_simulate(model.get(), in, &out), VEXLON_IP_CORVANE_OK);
   EXPECT_EQ(out.bits_stored, 40u);
   EXPECT_EQ(out.iterations_done, 16u);
   EXPECT_TRUE(std::all_of(bits.begin(), bits.begin() + 40, [](std::uint8_t b) { return b <= 1; }));
   EXPECT_EQ(bits[40], 0xEE);
+}
+
+TEST(CorvaneSimulate, RefusedBatchesDecodeNoBlock) {
+  vexlon_ip_corvane_generics generics = vexlon_ip_corvane_get_default_generics();
+  generics.max_code_blocks = 3;
+  Model model(generics);
+  ASSERT_NE(model.get(), nullptr);
+  const std::vector<std::int32_t> stream(44, 10);
+  vexlon_ip_corvane_inputs in[3];
+  for (auto& i : in)
+    i = {40, 2, 1, 0, stream.data(), 44, stream.data(), 44, stream.data(), 44, 0, 0};
+  struct Case {
+    const char* name;
+    bool nullInputs;
+    std::uint32_t count;
+    std::uint32_t badBlock;  // 3: none
+    std::int32_t status;
+  };
+  const Case cases[] = {
+      {"null inputs", true, 2, 3, VEXLON_IP_CORVANE_NULL_INPUTS},
+      {"no block", false, 0, 3, VEXLON_IP_CORVANE_BAD_BATCH_SIZE},
+      {"above max_code_blocks", false, 4, 3, VEXLON_IP_CORVANE_BAD_BATCH_SIZE},
+      {"third block refused", false, 3, 2, VEXLON_IP_CORVANE_BAD_ITERATIONS},
+  };
+  for (const Case& c : cases) {
+    std::vector<std::uint8_t> bits(3 * 40, 0xEE);
+    vexlon_ip_corvane_outputs out[4];
+    for (std::uint32_t b = 0; b < 4; ++b) out[b] = {9, 9, bits.data() + 40 * (b % 3), 40};
+    vexlon_ip_corvane_inputs blocks[4] = {in[0], in[1], in[2], in[0]};
+    if (c.badBlock < 3) blocks[c.badBlock].iterations = 0;
+    EXPECT_EQ(vexlon_ip_corvane_bitacc_simulate_batch(model.get(), c.nullInputs ? nullptr : blocks,
+                                                      c.count, out),
+              c.status)
+        << c.name;
+    EXPECT_EQ(bits, std::vector<std::uint8_t>(3 * 40, 0xEE)) << c.name;
+    for (std::uint32_t b = 0; b < c.count; ++b) {
+      EXPECT_EQ(out[b].bits_stored + out[b].iterations_done, 0u) << c.name;
+    }
+  }
+}
+
+// Entry d of the table at s steps per unit is round(s * ln(1 + e^(-d/s))) up to the first 0:
+// two scales in full, and a fingerprint of every scale's entries (taken with 50-digit
+// decimal arithmetic), which every build must reproduce.
+TEST(CorvaneCorrection, TablesOfEveryScale) {
+  const std::vector<int> eight = {6, 5, 5, 4, 4, 3, 3, 3, 3, 2, 2, 2,
+                                  2, 1, 1, 1, 1, 1, 1, 1, 1, 1, 0};
+  const std::vector<int> four = {3, 2, 2, 2, 1, 1, 1, 1, 1, 0};
+  std::uint64_t hash = 0xCBF29CE484222325ull;
+  for (std::uint32_t s = CorrectionTable::kMinStepsPerUnit; s <= CorrectionTable::kMaxStepsPerUnit;
+       ++s) {
+    const CorrectionTable table(s);
+    std::vector<int> entries;
+    for (int d = 0; d < table.size(); ++d) entries.push_back(table[d]);
+    if (s == 8) {
+      EXPECT_EQ(entries, eight);
+    } else if (s == 4) {
+      EXPECT_EQ(entries, four);
+    } else if (s == 32) {
+      EXPECT_EQ(table.size(), 134);
+    }
+    entries.insert(entries.begin(), table.size());
+    for (int v : entries) hash = (hash ^ static_cast<std::uint64_t>(v)) * 0x100000001B3ull;
+  }
+  EXPECT_EQ(hash, 0xED8ED877CAB284D6ull) << std::hex << hash;
 }
 
 TEST(CorvaneInterleaver, PermutationOfEveryBlockSizeMatchesThePolynomial) {

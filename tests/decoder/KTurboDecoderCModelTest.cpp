@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -108,6 +109,48 @@ TEST(KTurboDecoderCModel, FailuresPrintTheirLineAndLeaveTheOutput) {
   ASSERT_NE(made, nullptr);
   EXPECT_TRUE(made->setExtrinsicBits(9));
   EXPECT_EQ(stderrOf([&] { made = KTurboDecoderCModel::create(); }), "");
+}
+
+// Blocks decoded in batches give each block what decoding it alone gives: the same bits, and
+// for a batch the model refuses (a block of an unknown size), the same lines and result.
+TEST(KTurboDecoderCModel, BatchesEqualBlockByBlock) {
+  std::mt19937 rng(4);
+  const std::uint32_t sizes[] = {40, 1024, 6144, 3136, 512, 6144};
+  std::vector<std::vector<std::vector<std::int32_t>>> blocks;
+  for (int n = 0; n < 20; ++n) {
+    Block block = encodedBlock(sizes[n % 6]);
+    for (auto* stream : {&block.sys, &block.p1, &block.p2}) {
+      for (std::int32_t& v : *stream) v += static_cast<std::int32_t>(rng() % 161) - 80;
+    }
+    blocks.push_back({block.sys, block.p1, block.p2});
+  }
+  KTurboDecoderCModel batched;
+  KTurboDecoderCModel single;
+  std::vector<std::vector<std::uint8_t>> out;
+  for (const bool refused : {false, true}) {
+    if (refused) {
+      blocks[17][0].push_back(0);  // K = 6141 is no interleaver size; and a length mismatch
+      blocks[18] = {std::vector<std::int32_t>(45), std::vector<std::int32_t>(45),
+                    std::vector<std::int32_t>(45)};
+    }
+    bool batchResult = false;
+    const std::string batchLines =
+        stderrOf([&] { batchResult = batched.decodeBlocks(blocks, out, 3); });
+    std::vector<std::uint8_t> alone;
+    bool singleResult = true;
+    const std::string singleLines = stderrOf([&] {
+      for (std::size_t i = 0; i < blocks.size(); ++i) {
+        const bool ok = single.decode(blocks[i][0], blocks[i][1], blocks[i][2], alone, 3);
+        singleResult = ok && singleResult;
+        if (ok) {
+          EXPECT_EQ(out[i], alone) << "block " << i;
+        }
+      }
+    });
+    EXPECT_EQ(batchResult, singleResult);
+    EXPECT_EQ(batchLines, singleLines);
+    EXPECT_EQ(batchResult, !refused);
+  }
 }
 
 }  // namespace

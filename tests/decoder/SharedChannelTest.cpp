@@ -609,5 +609,48 @@ TEST(SharedChannelInstances, ParallelDecodesEqualSerialOnes) {
   }
 }
 
+// One instance, call A, then other calls (other sizes, modulation and UCI, calls that fail in
+// the checks and in the decode, a control-channel call), then A again: A's outputs are the
+// same bit for bit.
+TEST(SharedChannelInstances, CallsDoNotChangeEachOthersResults) {
+  Instance instance;
+  tx::ChannelSettings channel;
+  channel.mode = tx::ChannelMode::Awgn;
+  channel.esN0Db = 2.0;
+  Sent a = transmit({10, 4, CyclicPrefix::Normal, 3000, 0, 20, 2, 1}, channel, 21);
+  SchCall first = a.call;
+  ASSERT_EQ(first.run(instance.get()), 0);
+  Sent b = transmit({20, 6, CyclicPrefix::Extended, 9000, 2, 5, 1, 2}, channel, 22);
+  SchCall failsInChecks = b.call;
+  failsInChecks.control.SCH_RM_E_MINUS += 1;
+  SchCall failsInDecode = validCall();
+  failsInDecode.control.SCH_ACK_IP_SIZE = 3;
+  failsInDecode.control.SCH_ACK_OP_SIZE = 1;
+  stderrOf([&] {
+    EXPECT_EQ(b.call.run(instance.get()), 0);
+    EXPECT_EQ(failsInChecks.run(instance.get()), 158);
+    EXPECT_EQ(failsInDecode.run(instance.get()), 200);
+  });
+  std::array<std::uint8_t, 13> cqi{};
+  std::array<std::uint8_t, 2> ack{};
+  std::vector<std::int32_t> pucch(22, -40);
+  vexlon_ip_brannoc_CCH_outputs cchOut{cqi.data(), ack.data(), 13, 2, 0, 0, 0};
+  EXPECT_EQ(vexlon_ip_brannoc_CCH_bitacc_simulate(instance.get(),
+                                                  {pucch.data(), 22, {13, 0, 2, 0, 0}}, &cchOut),
+            0);
+  SchCall again = a.call;
+  ASSERT_EQ(again.run(instance.get()), 0);
+  EXPECT_EQ(again.data, first.data);
+  EXPECT_EQ(again.cqi, first.cqi);
+  EXPECT_EQ(again.ack, first.ack);
+  EXPECT_EQ(again.ri, first.ri);
+  EXPECT_EQ(again.cw, first.cw);
+  EXPECT_EQ(again.harqOut, first.harqOut);
+  EXPECT_EQ(again.outputs.SCH_TB_crc_error, first.outputs.SCH_TB_crc_error);
+  EXPECT_EQ(again.outputs.SCH_CQI_crc_error, first.outputs.SCH_CQI_crc_error);
+  EXPECT_EQ(again.outputs.SCH_ACK_parity_error, first.outputs.SCH_ACK_parity_error);
+  EXPECT_EQ(again.outputs.SCH_RI_parity_error, first.outputs.SCH_RI_parity_error);
+}
+
 }  // namespace
 }  // namespace brannoc::test

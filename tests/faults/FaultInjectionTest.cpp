@@ -53,6 +53,10 @@ void* operator new(std::size_t n) {
   }
   throw std::bad_alloc();
 }
+void* operator new(std::size_t n, const std::nothrow_t&) noexcept {
+  return failHere(n) ? nullptr : std::malloc(n == 0 ? 1 : n);
+}
+
 // The replaced operator new takes its memory from malloc, so free releases it.
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wmismatched-new-delete"
@@ -160,13 +164,20 @@ struct SchFault {
   bool retransmission;
   std::int32_t status;
   std::string lines;
+  // The instance's turbo units and algorithm: a call makes the turbo model again only for a
+  // value other than the model's (2 units and algorithm 1 at first).
+  std::uint32_t numPU = 2;
+  std::uint32_t algorithm = 1;
 };
 
 class SharedChannelFaults : public testing::TestWithParam<SchFault> {};
 
 TEST_P(SharedChannelFaults, GiveTheirCodeAndLine) {
   const SchFault& f = GetParam();
-  Instance instance;
+  vexlon_ip_brannoc_generics generics = vexlon_ip_brannoc_get_default_generics();
+  generics.C_NUM_PU = f.numPU;
+  generics.C_ALGORITHM_TYPE = f.algorithm;
+  Instance instance(generics);
   DataCall call;
   call.inputs.controlData.SCH_ND = f.retransmission ? 0 : 1;
   std::int32_t status = -1;
@@ -189,10 +200,12 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         SchFault{"ModelForUnits", [] { gCorvaneCreations = 0; }, false, 155,
                  kModelFailed + kIf +
-                     "ERROR:decoder:Failed to setup Turbo Decoder Number Processing Units \n"},
-        SchFault{
-            "ModelForAlgorithm", [] { gCorvaneCreations = 1; }, false, 156,
-            kModelFailed + kIf + "ERROR:decoder:Failed to setup Turbo Decoder Algorithm Type \n"},
+                     "ERROR:decoder:Failed to setup Turbo Decoder Number Processing Units \n",
+                 4, 1},
+        SchFault{"ModelForAlgorithm", [] { gCorvaneCreations = 0; }, false, 156,
+                 kModelFailed + kIf +
+                     "ERROR:decoder:Failed to setup Turbo Decoder Algorithm Type \n",
+                 2, 2},
         SchFault{"Llr", [] { failAllocation(1200 * sizeof(std::int32_t)); }, false, 164,
                  kIf + "ERROR:decoder:Out of memory caching input vector. Size expected:1200\n"},
         SchFault{"Harq", [] { failAllocation(1028 * sizeof(std::int32_t), 1); }, true, 165,

@@ -6,12 +6,19 @@
 // Eb/N0 counts the information bits: Es/N0 = Eb/N0 + 10 log10(K / (3K + 12)), slightly
 // harsher than the nominal rate 1/3. The soft values are raw = round(scale * LLR), halves
 // away from zero, saturated to -128..127, LLR = ln(P(1)/P(0)) computed with the true noise
-// variance; the default scale is 8 raw steps per natural-log unit, the scale the log-MAP
-// correction table of the library assumes.
+// variance; the default scale is 32 raw steps per natural-log unit (1.0 in 8:5 is one unit),
+// the library's default. The library's log-MAP correction is built for --steps steps per
+// unit (generics word 5), by default the input scale rounded.
+//
+// --path scalar or vector chooses the library's decoder (generics word 6; both give the same
+// bits, so the same table); --batch n decodes n frames per call of the batch entry point,
+// which fills the vector lanes (each frame's bits are those it gets alone).
 //
 // Each frame draws its bits and its noise from seeds derived from the frame number, so a
 // frame is the same whichever thread decodes it. A point stops once it has the requested
-// number of frame errors or the frame cap; frames in flight then are still counted.
+// number of frame errors or the frame cap, and counts the frames in order up to that point, so
+// that its row does not depend on the threads or the batch size.
+#include <algorithm>
 #include <atomic>
 #include <cmath>
 #include <cstdint>
@@ -39,7 +46,10 @@ struct Options {
   double step = 0.1;
   std::uint64_t minErrors = 50;
   std::uint64_t maxFrames = 20000;
-  double scale = 8.0;
+  double scale = 32.0;
+  std::uint32_t steps = 0;  // 0: the scale rounded
+  std::uint32_t path = 0;   // generics word 6: 0 automatic, 1 scalar, 2 vector
+  std::uint32_t batch = 1;
   unsigned threads = 2;
   std::uint64_t seed = 1;
 };
@@ -48,8 +58,8 @@ void usage() {
   std::fprintf(stderr,
                "usage: turbo_fer [--K n] [--algorithm 0|1|2] [--units 1|2|4|8] [--iterations n]\n"
                "                 [--extrinsic-bits n] [--from dB] [--to dB] [--step dB]\n"
-               "                 [--errors n] [--frames n] [--scale raw-per-LLR] [--threads n]\n"
-               "                 [--seed n]\n");
+               "                 [--errors n] [--frames n] [--scale raw-per-LLR] [--steps n]\n"
+               "                 [--path scalar|vector] [--batch n] [--threads n] [--seed n]\n");
 }
 
 std::uint32_t toU32(const char* text) {
@@ -82,6 +92,13 @@ bool parse(int argc, char** argv, Options& o) {
       o.maxFrames = std::strtoull(value, nullptr, 10);
     } else if (name == "--scale") {
       o.scale = std::strtod(value, nullptr);
+    } else if (name == "--steps") {
+      o.steps = toU32(value);
+    } else if (name == "--path") {
+      const std::string path = value;
+      o.path = path == "scalar" ? 1 : (path == "vector" ? 2 : 99);
+    } else if (name == "--batch") {
+      o.batch = toU32(value);
     } else if (name == "--threads") {
       o.threads = toU32(value);
     } else if (name == "--seed") {
@@ -90,7 +107,9 @@ bool parse(int argc, char** argv, Options& o) {
       return false;
     }
   }
-  return argc % 2 == 1 && o.step > 0 && o.threads > 0 && o.scale > 0;
+  if (o.steps == 0) o.steps = static_cast<std::uint32_t>(std::lround(o.scale));
+  return argc % 2 == 1 && o.step > 0 && o.threads > 0 && o.scale > 0 && o.path != 99 &&
+         o.batch >= 1 && o.batch <= 32 && o.maxFrames >= 1 && o.maxFrames <= 100000000;
 }
 
 std::uint64_t mix(std::uint64_t x) {
@@ -100,62 +119,88 @@ std::uint64_t mix(std::uint64_t x) {
   return x ^ (x >> 31);
 }
 
+// The frames of one point: the next frame number to draw, the frame errors so far (which
+// stop the workers), and each frame's bit errors by frame number.
 struct Counts {
+  explicit Counts(std::uint64_t frames) : bitErrors(frames) {}
   std::atomic<std::uint64_t> nextFrame{0};
-  std::atomic<std::uint64_t> frames{0};
   std::atomic<std::uint64_t> frameErrors{0};
-  std::atomic<std::uint64_t> bitErrors{0};
+  std::vector<std::uint32_t> bitErrors;
 };
 
-// Decodes frames of one Eb/N0 point until the point has enough errors or frames.
+// One frame: its information bits, its soft streams and its decisions.
+struct Frame {
+  std::vector<std::uint8_t> c, decided;
+  std::vector<std::int32_t> soft[3];
+};
+
+// Draws frame number `frame` of the point: bits from the seed, the transmitter's codeword,
+// BPSK soft values with the point's noise. False when the transmitter refuses.
+bool makeFrame(const Options& o, const brannoc::tx::ChannelSettings& channel,
+               std::uint64_t pointSeed, std::uint64_t frame, Frame& f) {
+  f.c.resize(o.K);
+  f.decided.resize(o.K);
+  std::uint64_t bitSeed = mix(pointSeed ^ mix(frame));
+  for (std::uint32_t k = 0; k < o.K; k += 64) {
+    bitSeed = mix(bitSeed);
+    for (std::uint32_t b = 0; b < 64 && k + b < o.K; ++b) f.c[k + b] = (bitSeed >> b) & 1;
+  }
+  brannoc::tx::TurboCodeword d;
+  if (!brannoc::tx::turboEncode(f.c, d)) return false;
+  brannoc::tx::GaussianSource noise(mix(bitSeed + 1));
+  const brannoc::tx::Bits* streams[3] = {&d.d0, &d.d1, &d.d2};
+  for (int s = 0; s < 3; ++s) {
+    f.soft[s].clear();
+    brannoc::tx::appendSoftValues(*streams[s], brannoc::tx::Constellation::PucchBpsk, channel,
+                                  noise, f.soft[s]);
+  }
+  return true;
+}
+
+// Decodes frames of one Eb/N0 point, o.batch per call, until the point has enough errors or
+// frames.
 bool runWorker(const Options& o, double esN0Db, std::uint64_t pointSeed, Counts& counts) {
   vexlon_ip_corvane_generics generics = vexlon_ip_corvane_get_default_generics();
   generics.max_block_size = o.K;
   generics.processing_units = o.units;
   generics.algorithm = o.algorithm;
   generics.extrinsic_bits = o.extrinsicBits;
+  generics.steps_per_unit = o.steps;
+  generics.decoder_path = o.path;
+  generics.max_code_blocks = o.batch;
   vexlon_ip_corvane_state* model = vexlon_ip_corvane_create_state(generics);
   if (model == nullptr) return false;
   brannoc::tx::ChannelSettings channel;
   channel.mode = brannoc::tx::ChannelMode::Awgn;
   channel.esN0Db = esN0Db;
   channel.llrScale = o.scale / brannoc::tx::kSoftOne;
-  std::vector<std::uint8_t> c(o.K), decided(o.K);
-  std::vector<std::int32_t> soft[3];
-  brannoc::tx::TurboCodeword d;
+  std::vector<Frame> frames(o.batch);
+  std::vector<vexlon_ip_corvane_inputs> in(o.batch);
+  std::vector<vexlon_ip_corvane_outputs> out(o.batch);
+  std::vector<std::uint64_t> frameNumbers(o.batch);
+  const std::uint32_t N = o.K + 4;
   bool ok = true;
-  while (counts.frameErrors.load() < o.minErrors) {
-    const std::uint64_t frame = counts.nextFrame.fetch_add(1);
-    if (frame >= o.maxFrames) break;
-    std::uint64_t bitSeed = mix(pointSeed ^ mix(frame));
-    for (std::uint32_t k = 0; k < o.K; k += 64) {
-      bitSeed = mix(bitSeed);
-      for (std::uint32_t b = 0; b < 64 && k + b < o.K; ++b) c[k + b] = (bitSeed >> b) & 1;
+  while (ok && counts.frameErrors.load() < o.minErrors) {
+    std::uint32_t count = 0;
+    for (; count < o.batch; ++count) {
+      const std::uint64_t frame = counts.nextFrame.fetch_add(1);
+      if (frame >= o.maxFrames) break;
+      frameNumbers[count] = frame;
+      Frame& f = frames[count];
+      ok = ok && makeFrame(o, channel, pointSeed, frame, f);
+      in[count] = {
+          o.K, o.iterations, 1, 0, f.soft[0].data(), N, f.soft[1].data(), N, f.soft[2].data(), N, 0,
+          0};
+      out[count] = {0, 0, f.decided.data(), o.K};
     }
-    if (!brannoc::tx::turboEncode(c, d)) {
-      ok = false;
-      break;
+    if (count == 0) break;
+    ok = ok && vexlon_ip_corvane_bitacc_simulate_batch(model, in.data(), count, out.data()) == 0;
+    for (std::uint32_t i = 0; ok && i < count; ++i) {
+      std::uint32_t errors = 0;
+      for (std::uint32_t k = 0; k < o.K; ++k) errors += frames[i].decided[k] != frames[i].c[k];
+      counts.bitErrors[frameNumbers[i]] = errors;
+      if (errors != 0) counts.frameErrors.fetch_add(1);
     }
-    brannoc::tx::GaussianSource noise(mix(bitSeed + 1));
-    const brannoc::tx::Bits* streams[3] = {&d.d0, &d.d1, &d.d2};
-    for (int s = 0; s < 3; ++s) {
-      soft[s].clear();
-      brannoc::tx::appendSoftValues(*streams[s], brannoc::tx::Constellation::PucchBpsk, channel,
-                                    noise, soft[s]);
-    }
-    const std::uint32_t N = o.K + 4;
-    const vexlon_ip_corvane_inputs in{o.K, o.iterations, 1, 0, soft[0].data(), N,
-                                      soft[1].data(), N, soft[2].data(), N, 0, 0};
-    vexlon_ip_corvane_outputs out{0, 0, decided.data(), o.K};
-    if (vexlon_ip_corvane_bitacc_simulate(model, in, &out) != 0) {
-      ok = false;
-      break;
-    }
-    std::uint64_t errors = 0;
-    for (std::uint32_t k = 0; k < o.K; ++k) errors += decided[k] != c[k] ? 1 : 0;
-    counts.frames.fetch_add(1);
-    counts.bitErrors.fetch_add(errors);
-    if (errors != 0) counts.frameErrors.fetch_add(1);
   }
   vexlon_ip_corvane_destroy_state(model);
   return ok;
@@ -170,10 +215,13 @@ int main(int argc, char** argv) {
     return 2;
   }
   const double rate = static_cast<double>(o.K) / (3.0 * o.K + 12.0);
-  std::printf("# K %u, algorithm %u, units %u, iterations %u, extrinsic bits %u,"
-              " scale %.3g raw/LLR, BPSK over AWGN, rate %u/%u\n",
-              o.K, o.algorithm, o.units, o.iterations, o.extrinsicBits, o.scale, o.K,
-              3 * o.K + 12);
+  const char* paths[] = {"automatic", "scalar", "vector"};
+  std::printf(
+      "# K %u, algorithm %u, units %u, iterations %u, extrinsic bits %u,"
+      " scale %.3g raw/LLR, correction for %u steps/unit, %s decoder, batch %u,"
+      " BPSK over AWGN, rate %u/%u\n",
+      o.K, o.algorithm, o.units, o.iterations, o.extrinsicBits, o.scale, o.steps, paths[o.path],
+      o.batch, o.K, 3 * o.K + 12);
   std::printf("# stop at %llu frame errors or %llu frames\n",
               static_cast<unsigned long long>(o.minErrors),
               static_cast<unsigned long long>(o.maxFrames));
@@ -183,7 +231,7 @@ int main(int argc, char** argv) {
     const double ebN0Db = o.from + point * o.step;
     if (ebN0Db > o.to + 1e-9) break;
     const double esN0Db = ebN0Db + 10.0 * std::log10(rate);
-    Counts counts;
+    Counts counts(o.maxFrames);
     std::vector<std::thread> workers;
     std::atomic<bool> failed{false};
     const std::uint64_t pointSeed = mix(o.seed * 1000 + static_cast<std::uint64_t>(point));
@@ -197,11 +245,20 @@ int main(int argc, char** argv) {
       std::fprintf(stderr, "turbo_fer: the model refused the configuration or a frame\n");
       return 1;
     }
-    const double frames = static_cast<double>(counts.frames.load());
+    // The point counts frames 0..F-1, F the first frame count with enough frame errors (or
+    // every frame drawn): the same table for any number of threads and batch size.
+    std::uint64_t frames = 0, frameErrors = 0, bitErrors = 0;
+    const std::uint64_t drawn = std::min<std::uint64_t>(counts.nextFrame.load(), o.maxFrames);
+    while (frames < drawn && frameErrors < o.minErrors) {
+      bitErrors += counts.bitErrors[frames];
+      frameErrors += counts.bitErrors[frames] != 0 ? 1 : 0;
+      ++frames;
+    }
     std::printf("| %.2f | %llu | %llu | %.3e | %.3e |\n", ebN0Db,
-                static_cast<unsigned long long>(counts.frames.load()),
-                static_cast<unsigned long long>(counts.frameErrors.load()),
-                counts.frameErrors.load() / frames, counts.bitErrors.load() / (frames * o.K));
+                static_cast<unsigned long long>(frames),
+                static_cast<unsigned long long>(frameErrors),
+                static_cast<double>(frameErrors) / static_cast<double>(frames),
+                static_cast<double>(bitErrors) / (static_cast<double>(frames) * o.K));
     std::fflush(stdout);
   }
   return 0;

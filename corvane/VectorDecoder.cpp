@@ -1,0 +1,650 @@
+// The vectorised turbo decoder (see VectorDecoder.h), written once over Highway and compiled
+// for every target by foreach_target.h, which includes this file once per target.
+#include "VectorDecoder.h"
+
+#include <algorithm>
+
+#if CORVANE_HAVE_HIGHWAY
+
+#undef HWY_TARGET_INCLUDE
+#define HWY_TARGET_INCLUDE "VectorDecoder.cpp"
+#include <hwy/foreach_target.h>  // IWYU pragma: keep
+#include <hwy/highway.h>
+
+HWY_BEFORE_NAMESPACE();
+namespace corvane {
+namespace HWY_NAMESPACE {
+
+namespace hn = hwy::HWY_NAMESPACE;
+
+#if HWY_TARGET == HWY_SCALAR
+// The one-lane fallback target (a processor without SSSE3) decodes with the scalar decoder.
+void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
+  for (std::size_t b = 0; b < count; ++b) work.oneLane.decode(*blocks[b]);
+}
+#else
+
+// max for max-log-MAP; pair() combines two pairs of operands.
+struct MaxCombine {
+  template <class V>
+  HWY_INLINE void pair(V a0, V b0, V a1, V b1, V& out0, V& out1) const {
+    out0 = hn::Max(a0, b0);
+    out1 = hn::Max(a1, b1);
+  }
+};
+
+// max* for log-MAP: max(a, b) plus the correction of |a - b|. The differences of two
+// combinations are saturated to bytes and looked up 15 entries at a time in 16-byte tables
+// (byte shuffles): chunk c adds f(15c + min(x, 15)) - f(15c + 15), x = (d - 15c) floored at
+// 0, and the chunks' sum telescopes to f(d) once the last chunk reaches the table's final 0.
+// A table longer than 256 entries (more than 54 steps per unit) counts the thresholds above
+// the difference instead (the table falls monotonically, so this is its entry).
+struct LogMapCombine {
+  const VectorWorkspace* work;
+  template <class V>
+  HWY_INLINE V thresholdsAbove(V difference) const {
+    const hn::DFromV<V> d;
+    V above = hn::Zero(d);  // each true mask is -1
+    for (int v = 0; v < work->thresholdCount; ++v) {
+      above =
+          hn::Sub(above, hn::VecFromMask(d, hn::Lt(difference, hn::Set(d, work->threshold[v]))));
+    }
+    return above;
+  }
+  template <class V>
+  HWY_INLINE void pair(V a0, V b0, V a1, V b1, V& out0, V& out1) const {
+    const hn::DFromV<V> d;
+    const V larger0 = hn::Max(a0, b0);
+    const V larger1 = hn::Max(a1, b1);
+    const V difference0 = hn::SaturatedSub(larger0, hn::Min(a0, b0));
+    const V difference1 = hn::SaturatedSub(larger1, hn::Min(a1, b1));
+    if (work->chunkCount == 0) {
+      out0 = hn::Add(larger0, thresholdsAbove(difference0));
+      out1 = hn::Add(larger1, thresholdsAbove(difference1));
+      return;
+    }
+    const hn::Repartition<std::uint8_t, decltype(d)> bytes;
+    const hn::Rebind<std::uint8_t, decltype(d)> halfBytes;
+    const auto packed = hn::Combine(bytes, hn::DemoteTo(halfBytes, difference1),
+                                    hn::DemoteTo(halfBytes, difference0));
+    const auto fifteen = hn::Set(bytes, std::uint8_t{15});
+    auto correction = hn::Zero(bytes);
+    for (int c = 0; c < work->chunkCount; ++c) {
+      const auto x = hn::SaturatedSub(packed, hn::Set(bytes, static_cast<std::uint8_t>(15 * c)));
+      const auto table = hn::LoadDup128(bytes, work->chunkTable + 16 * c);
+      correction = hn::Add(correction, hn::TableLookupBytes(table, hn::Min(x, fifteen)));
+    }
+    out0 = hn::Add(larger0, hn::BitCast(d, hn::PromoteTo(hn::Rebind<std::uint16_t, decltype(d)>(),
+                                                         hn::LowerHalf(halfBytes, correction))));
+    out1 = hn::Add(larger1, hn::BitCast(d, hn::PromoteTo(hn::Rebind<std::uint16_t, decltype(d)>(),
+                                                         hn::UpperHalf(halfBytes, correction))));
+  }
+};
+
+// The backward recursion runs in the forward recursion's form on relabelled states:
+// register i holds beta of state sigma(i), sigma reversing the three state bits. Then
+// beta_k's butterflies (0, 1) <- (0, 4), (2, 3) <- (1, 5), (4, 5) <- (2, 6), (6, 7) <- (3, 7)
+// become the forward butterflies 0 <- (0, 1), 2 <- (4, 5), 1 <- (2, 3), 3 <- (6, 7) with the
+// branch metrics Lu and Lp exchanged, and state 0 stays register 0.
+constexpr int kSigma[kStates] = {0, 4, 2, 6, 1, 5, 3, 7};
+
+// f(1), ..., f(7) written out, so that arrays of state registers indexed by the argument stay
+// in registers (a loop over them would keep them in memory).
+template <class F>
+HWY_INLINE void forStates1To7(const F& f) {
+  f(1);
+  f(2);
+  f(3);
+  f(4);
+  f(5);
+  f(6);
+  f(7);
+}
+
+// One step of the forward recursion (forwardStep) on the metrics of states 1..7 in m[1..7]
+// (state 0's is 0 before and after: every metric is kept relative to it), with Lu = g and
+// Lp = p; one step of the backward recursion on relabelled metrics with Lu = p and Lp = g.
+template <class Combine, class V>
+HWY_INLINE void trellisStep(const Combine& combine, V (&m)[kStates], V zero, V g, V p) {
+  const V both = hn::Add(g, p);
+  V n0, n1, n2, n3, n4, n5, n6, n7;
+  combine.pair(zero, hn::Add(m[1], both), both, m[1], n0, n4);
+  combine.pair(hn::Add(m[2], g), hn::Add(m[3], p), hn::Add(m[2], p), hn::Add(m[3], g), n1, n5);
+  combine.pair(hn::Add(m[4], p), hn::Add(m[5], g), hn::Add(m[4], g), hn::Add(m[5], p), n2, n6);
+  combine.pair(hn::Add(m[6], both), m[7], m[6], hn::Add(m[7], both), n3, n7);
+  m[1] = hn::Sub(n1, n0);
+  m[2] = hn::Sub(n2, n0);
+  m[3] = hn::Sub(n3, n0);
+  m[4] = hn::Sub(n4, n0);
+  m[5] = hn::Sub(n5, n0);
+  m[6] = hn::Sub(n6, n0);
+  m[7] = hn::Sub(n7, n0);
+}
+
+// extrinsicStep from alpha_k (a[1..7]) and relabelled beta_k+1 (r[1..7]), alpha_0 = beta_0 = 0.
+template <class D, class Combine, class V>
+HWY_INLINE V extrinsicOf(D d, const Combine& combine, const V (&a)[kStates], const V (&r)[kStates],
+                         V zero, V p) {
+  const V b1 = r[4], b2 = r[2], b3 = r[6], b4 = r[1], b5 = r[5], b6 = r[3], b7 = r[7];
+  // The four groups of equal (u, p), each combined pairwise as combine4 does.
+  V one0a, one0b, one1a, one1b, zero0a, zero0b, zero1a, zero1b;
+  combine.pair(hn::Add(a[2], b1), hn::Add(a[3], b5), hn::Add(a[4], b6), hn::Add(a[5], b2), one0a,
+               one0b);
+  combine.pair(b4, a[1], hn::Add(a[6], b3), hn::Add(a[7], b7), one1a, one1b);
+  combine.pair(zero, hn::Add(a[1], b4), hn::Add(a[6], b7), hn::Add(a[7], b3), zero0a, zero0b);
+  combine.pair(hn::Add(a[2], b5), hn::Add(a[3], b1), hn::Add(a[4], b2), hn::Add(a[5], b6), zero1a,
+               zero1b);
+  V oneParity0, oneParity1, zeroParity0, zeroParity1, one, none;
+  combine.pair(one0a, one0b, one1a, one1b, oneParity0, oneParity1);
+  combine.pair(zero0a, zero0b, zero1a, zero1b, zeroParity0, zeroParity1);
+  combine.pair(oneParity0, hn::Add(oneParity1, p), zeroParity0, hn::Add(zeroParity1, p), one, none);
+  const V e = hn::SaturatedSub(one, none);
+  return hn::Max(e, hn::Set(d, -32767));
+}
+
+// One lane group of one half-iteration, lanes = segments: the forward recursion from the
+// alpha metrics in states[0..7] (one row of lanes per state) over `length` steps, storing
+// the alpha of every stride-th step, then the backward recursion from the relabelled beta
+// metrics in states[8..15] with the raw extrinsic value of every step (an alpha not stored
+// is made again from the last stored one). Leaves the reached alpha and (relabelled) beta in
+// states. A stride of 2 halves the store for long windows, which then stays in the cache.
+template <class D, class Combine>
+HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_t* HWY_RESTRICT lu,
+                                  const std::int16_t* HWY_RESTRICT lp, std::size_t length,
+                                  std::size_t stride, std::int16_t* HWY_RESTRICT alphaStore,
+                                  std::int16_t* HWY_RESTRICT states,
+                                  std::int16_t* HWY_RESTRICT extrinsic) {
+  using V = decltype(hn::Zero(d));
+  const std::size_t N = hn::Lanes(d);
+  const V zero = hn::Zero(d);
+  V a[kStates], r[kStates];
+  forStates1To7([&](int m) { a[m] = hn::Load(d, states + m * N); });
+  for (std::size_t k = 0; k < length; ++k) {
+    if (k % stride == 0) {
+      std::int16_t* store = alphaStore + k / stride * 7 * N;
+      forStates1To7([&](int m) { hn::Store(a[m], d, store + (m - 1) * N); });
+    }
+    trellisStep(combine, a, zero, hn::Load(d, lu + k * N), hn::Load(d, lp + k * N));
+  }
+  forStates1To7([&](int m) { hn::Store(a[m], d, states + m * N); });
+  forStates1To7([&](int m) { r[m] = hn::Load(d, states + (8 + m) * N); });
+  for (std::size_t k = length; k-- > 0;) {
+    const std::size_t stored = k - k % stride;
+    const std::int16_t* store = alphaStore + stored / stride * 7 * N;
+    forStates1To7([&](int m) { a[m] = hn::Load(d, store + (m - 1) * N); });
+    for (std::size_t t = stored; t < k; ++t) {
+      trellisStep(combine, a, zero, hn::Load(d, lu + t * N), hn::Load(d, lp + t * N));
+    }
+    const V g = hn::Load(d, lu + k * N);
+    const V p = hn::Load(d, lp + k * N);
+    hn::Store(extrinsicOf(d, combine, a, r, zero, p), d, extrinsic + k * N);
+    trellisStep(combine, r, zero, p, g);
+  }
+  forStates1To7([&](int m) { hn::Store(r[m], d, states + (8 + m) * N); });
+}
+
+// The same for a lane group of at most half a vector: the forward recursion in the lower
+// half and the backward recursion in the upper half of every register advance together
+// (step t takes alpha_t to alpha_t+1 and beta_L-t to beta_L-t-1, storing both), then every
+// step's extrinsic value is formed from the stored metrics, steps k and L-1-k side by side.
+template <class D, class Combine>
+HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
+                                        const std::int16_t* HWY_RESTRICT lu,
+                                        const std::int16_t* HWY_RESTRICT lp, std::size_t length,
+                                        std::int16_t* HWY_RESTRICT store,
+                                        std::int16_t* HWY_RESTRICT states,
+                                        std::int16_t* HWY_RESTRICT extrinsic) {
+  using V = decltype(hn::Zero(d));
+  const hn::Half<D> dh;
+  const std::size_t N = hn::Lanes(dh);
+  const std::size_t last = length - 1;
+  const V zero = hn::Zero(d);
+  V m[kStates];
+  forStates1To7([&](int i) {
+    m[i] = hn::Combine(d, hn::Load(dh, states + (8 + i) * N), hn::Load(dh, states + i * N));
+  });
+  for (std::size_t t = 0; t < length; ++t) {
+    std::int16_t* row = store + t * 7 * 2 * N;
+    forStates1To7([&](int i) { hn::Store(m[i], d, row + (i - 1) * 2 * N); });
+    const V g = hn::Combine(d, hn::Load(dh, lp + (last - t) * N), hn::Load(dh, lu + t * N));
+    const V p = hn::Combine(d, hn::Load(dh, lu + (last - t) * N), hn::Load(dh, lp + t * N));
+    trellisStep(combine, m, zero, g, p);
+  }
+  forStates1To7([&](int i) {
+    hn::Store(hn::LowerHalf(dh, m[i]), dh, states + i * N);
+    hn::Store(hn::UpperHalf(dh, m[i]), dh, states + (8 + i) * N);
+  });
+  // Row t holds alpha_t below and beta_L-t above: steps k and k2 = L-1-k read alpha from
+  // rows k and k2, and beta_k+1 and beta_k2+1 from rows k2 and k.
+  for (std::size_t k = 0; k <= last - k; ++k) {
+    const std::size_t k2 = last - k;
+    const std::int16_t* rowK = store + k * 7 * 2 * N;
+    const std::int16_t* rowK2 = store + k2 * 7 * 2 * N;
+    V a[kStates], r[kStates];
+    forStates1To7([&](int i) {
+      const V fromK = hn::Load(d, rowK + (i - 1) * 2 * N);
+      const V fromK2 = hn::Load(d, rowK2 + (i - 1) * 2 * N);
+      a[i] = hn::ConcatLowerLower(d, fromK2, fromK);
+      r[i] = hn::ConcatUpperUpper(d, fromK, fromK2);
+    });
+    const V p = hn::Combine(d, hn::Load(dh, lp + k2 * N), hn::Load(dh, lp + k * N));
+    const V e = extrinsicOf(d, combine, a, r, zero, p);
+    hn::Store(hn::UpperHalf(dh, e), dh, extrinsic + k2 * N);
+    hn::Store(hn::LowerHalf(dh, e), dh, extrinsic + k * N);
+  }
+}
+
+// The a priori value of a raw extrinsic value: scaled by 0.75 for scaled max-log-MAP (the
+// product rounded as ScaledMaxLogPolicy does), saturated to the extrinsic width. The raw
+// value is first limited to +-2047, which changes no result (0.75 * 2047 exceeds every
+// extrinsic limit) and keeps 3e within 16 bits.
+template <class D>
+struct APriori {
+  using V = decltype(hn::Zero(D()));
+  V limit, negativeLimit, bound, negativeBound, two;
+  bool scaled;
+  explicit APriori(const VectorWorkspace& work) {
+    const D d;
+    limit = hn::Set(d, static_cast<std::int16_t>(work.extrinsicLimit));
+    negativeLimit = hn::Neg(limit);
+    bound = hn::Set(d, 2047);
+    negativeBound = hn::Neg(bound);
+    two = hn::Set(d, 2);
+    scaled = work.algorithm == Algorithm::ScaledMaxLog;
+  }
+  HWY_INLINE V operator()(V e) const {
+    const D d;
+    if (scaled) {
+      e = hn::Min(hn::Max(e, negativeBound), bound);
+      const V triple = hn::Add(hn::Add(e, e), e);
+      // (3e + 2 - [3e < 0]) >> 2: the mask of 3e < 0 is -1.
+      e = hn::ShiftRight<2>(
+          hn::Add(hn::Add(triple, two), hn::VecFromMask(d, hn::Lt(triple, hn::Zero(d)))));
+    }
+    return hn::Min(hn::Max(e, negativeLimit), limit);
+  }
+};
+
+// Carries values of one decoder's order into the other's: the value for step k of every
+// window comes from step source[k] of the same lane group, its lanes rearranged within each
+// block's windows by pattern[k] (16 byte indices, repeated in every 128-bit block: the P
+// windows of a block share one 128-bit block, P dividing 8). out = add + transform(moved).
+template <class D, class Transform>
+HWY_NOINLINE void permuteSteps(D d, const Transform& transform, const VectorWorkspace& work,
+                               int toDecoder, std::size_t laneGroups, std::size_t L,
+                               const std::int16_t* HWY_RESTRICT from,
+                               const std::int16_t* HWY_RESTRICT add,
+                               std::int16_t* HWY_RESTRICT out) {
+  const std::size_t N = hn::Lanes(d);
+  const hn::Repartition<std::uint8_t, D> bytes;
+  const std::uint16_t* source = work.sourceStep[toDecoder].get();
+  const std::uint8_t* pattern = work.lanePattern[toDecoder].get();
+  const bool permuted = work.processingUnits > 1;
+  for (std::size_t group = 0; group < laneGroups; ++group) {
+    const std::size_t first = group * L * N;
+    for (std::size_t k = 0; k < L; ++k) {
+      auto moved = hn::Load(d, from + first + source[k] * N);
+      if (permuted) {
+        moved =
+            hn::TableLookupBytes(moved, hn::BitCast(d, hn::LoadDup128(bytes, pattern + 16 * k)));
+      }
+      const std::size_t at = first + k * N;
+      hn::Store(hn::Add(hn::Load(d, add + at), transform(moved)), d, out + at);
+    }
+  }
+}
+
+// out[i] = in[i] saturated to -128..127, the received soft values' range.
+template <class D>
+HWY_NOINLINE void saturateSoftValues(D /* d */, const std::int32_t* in, std::int16_t* out,
+                                     std::size_t count) {
+  const hn::Repartition<std::int32_t, D> d32;
+  const hn::Rebind<std::int16_t, decltype(d32)> d16;
+  const std::size_t M = hn::Lanes(d32);
+  const auto low = hn::Set(d16, -128);
+  const auto high = hn::Set(d16, 127);
+  std::size_t i = 0;
+  for (; i + M <= count; i += M) {
+    hn::StoreU(hn::Min(hn::Max(hn::DemoteTo(d16, hn::LoadU(d32, in + i)), low), high), d16,
+               out + i);
+  }
+  for (; i < count; ++i) out[i] = softValue(in[i]);
+}
+
+// out[t * stride + s] = source[s][t] for s, t in 0..7: eight values of eight segments
+// transposed into eight rows (16-bit, 32-bit and 64-bit interleaves).
+template <class D8>
+HWY_INLINE void transpose8(D8 d8, const std::int16_t* const (&source)[8], std::int16_t* out,
+                           std::size_t stride) {
+  const hn::Repartition<std::int32_t, D8> d32;
+  const hn::Repartition<std::int64_t, D8> d64;
+  const auto r0 = hn::LoadU(d8, source[0]), r1 = hn::LoadU(d8, source[1]);
+  const auto r2 = hn::LoadU(d8, source[2]), r3 = hn::LoadU(d8, source[3]);
+  const auto r4 = hn::LoadU(d8, source[4]), r5 = hn::LoadU(d8, source[5]);
+  const auto r6 = hn::LoadU(d8, source[6]), r7 = hn::LoadU(d8, source[7]);
+  const auto t0 = hn::BitCast(d32, hn::InterleaveLower(d8, r0, r1));
+  const auto t1 = hn::BitCast(d32, hn::InterleaveUpper(d8, r0, r1));
+  const auto t2 = hn::BitCast(d32, hn::InterleaveLower(d8, r2, r3));
+  const auto t3 = hn::BitCast(d32, hn::InterleaveUpper(d8, r2, r3));
+  const auto t4 = hn::BitCast(d32, hn::InterleaveLower(d8, r4, r5));
+  const auto t5 = hn::BitCast(d32, hn::InterleaveUpper(d8, r4, r5));
+  const auto t6 = hn::BitCast(d32, hn::InterleaveLower(d8, r6, r7));
+  const auto t7 = hn::BitCast(d32, hn::InterleaveUpper(d8, r6, r7));
+  const auto u0 = hn::BitCast(d64, hn::InterleaveLower(d32, t0, t2));
+  const auto u1 = hn::BitCast(d64, hn::InterleaveUpper(d32, t0, t2));
+  const auto u2 = hn::BitCast(d64, hn::InterleaveLower(d32, t1, t3));
+  const auto u3 = hn::BitCast(d64, hn::InterleaveUpper(d32, t1, t3));
+  const auto u4 = hn::BitCast(d64, hn::InterleaveLower(d32, t4, t6));
+  const auto u5 = hn::BitCast(d64, hn::InterleaveUpper(d32, t4, t6));
+  const auto u6 = hn::BitCast(d64, hn::InterleaveLower(d32, t5, t7));
+  const auto u7 = hn::BitCast(d64, hn::InterleaveUpper(d32, t5, t7));
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u0, u4)), d8, out + 0 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u0, u4)), d8, out + 1 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u1, u5)), d8, out + 2 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u1, u5)), d8, out + 3 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u2, u6)), d8, out + 4 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u2, u6)), d8, out + 5 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u3, u7)), d8, out + 6 * stride);
+  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u3, u7)), d8, out + 7 * stride);
+}
+
+// The tables of permuteSteps for the group's K, from the QPP permutation: Pi(w*L + k) is
+// congruent to Pi(k) modulo L for every window w (Pi(x + L) - Pi(x) = L * (f1 + f2 * (2x + L))),
+// so the interleaved step k of every window reads one natural step, and back.
+void buildStepTables(VectorWorkspace& work, const QppRow& row) {
+  const std::size_t K = row.K;
+  const std::size_t P = work.processingUnits;
+  const std::size_t L = K / P;
+  std::uint16_t* pi = work.pi.get();
+  std::uint16_t* inverse = work.piInverse.get();
+  buildQppPermutation(row, pi);
+  for (std::size_t i = 0; i < K; ++i) inverse[pi[i]] = static_cast<std::uint16_t>(i);
+  const std::uint16_t* maps[2] = {inverse, pi};  // to decoder 0: natural <- interleaved
+  for (int decoder = 0; decoder < 2; ++decoder) {
+    const std::uint16_t* map = maps[decoder];
+    for (std::size_t k = 0; k < L; ++k) {
+      work.sourceStep[decoder].get()[k] = static_cast<std::uint16_t>(map[k] % L);
+      std::uint8_t* pattern = work.lanePattern[decoder].get() + 16 * k;
+      for (std::size_t lane = 0; lane < 8; ++lane) {
+        const std::size_t w = lane % P;
+        const std::size_t source = lane - w + map[w * L + k] / L;
+        pattern[2 * lane] = static_cast<std::uint8_t>(2 * source);
+        pattern[2 * lane + 1] = static_cast<std::uint8_t>(2 * source + 1);
+      }
+    }
+  }
+  work.tablesK = K;
+}
+
+// Decodes a group in lane groups of d's width; a group that fills at most half of dPaired's
+// lanes runs the paired recursions in dPaired's registers.
+template <class D, class DPaired>
+void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBlock* const* blocks,
+                     std::size_t count) {
+  const std::size_t K = blocks[0]->row->K;
+  const std::size_t P = work.processingUnits;
+  const std::size_t N = hn::Lanes(d);
+  const std::size_t S = count * P;
+  const std::size_t laneGroups = (S + N - 1) / N;
+  const std::size_t L = K / P;
+  const std::size_t positions = laneGroups * L * N;
+  const std::uint32_t iterations = blocks[0]->iterations;
+  const bool paired = laneGroups == 1 && hn::Lanes(dPaired) == 2 * N;
+  // Every second alpha stored when all would take more than 1 MiB.
+  const std::size_t stride = 7 * N * L * sizeof(std::int16_t) > (std::size_t{1} << 20) ? 2 : 1;
+  if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
+
+  const std::uint16_t* pi = work.pi.get();
+  std::int16_t* sys[2] = {work.systematic[0].get(), work.systematic[1].get()};
+  std::int16_t* par[2] = {work.parity[0].get(), work.parity[1].get()};
+  std::int16_t* lu = work.lu.get();
+  std::int16_t* extrinsic = work.extrinsic.get();
+  // Every value of the group in array order (so that the array accesses stream): block b's
+  // window w is segment s = b*P + w, in lane s % N of lane group s / N (a lane group holds
+  // N / P whole blocks); lanes without a segment hold zeros.
+  const auto forEachValue = [&](const auto& visit) {
+    for (std::size_t group = 0; group < laneGroups; ++group) {
+      const std::size_t firstBlock = group * (N / P);
+      const std::size_t groupBlocks = std::min(N / P, count - firstBlock);
+      for (std::size_t k = 0; k < L; ++k) {
+        std::size_t j = (group * L + k) * N;
+        for (std::size_t b = firstBlock; b < firstBlock + groupBlocks; ++b) {
+          for (std::size_t i = k; i < K; i += L) visit(j++, b, i);
+        }
+      }
+    }
+  };
+  if (S % N != 0) {
+    std::fill_n(sys[0], positions, std::int16_t{0});
+    std::fill_n(par[0], positions, std::int16_t{0});
+    std::fill_n(par[1], positions, std::int16_t{0});
+  }
+  // Streams d0, d1, d2 of block b saturated at received + (3b + stream) * K.
+  std::int16_t* received = work.received.get();
+  for (std::size_t b = 0; b < count; ++b) {
+    saturateSoftValues(d, blocks[b]->d0, received + (3 * b) * K, K);
+    saturateSoftValues(d, blocks[b]->d1, received + (3 * b + 1) * K, K);
+    saturateSoftValues(d, blocks[b]->d2, received + (3 * b + 2) * K, K);
+  }
+  // Into the lanes: eight segments by eight steps at a time, the rest value by value.
+  const hn::CappedTag<std::int16_t, 8> d8;
+  std::int16_t* arrays[3] = {sys[0], par[0], par[1]};
+  const std::size_t fullRows = L - L % 8;
+  for (std::size_t first = 0; first < S; first += 8) {
+    const std::size_t group = first / N;
+    const std::size_t lanes = std::min<std::size_t>(8, S - first);
+    for (int stream = 0; stream < 3; ++stream) {
+      const std::int16_t* source[8];
+      for (std::size_t s = 0; s < lanes; ++s) {
+        const std::size_t segment = first + s;
+        source[s] = received + (3 * (segment / P) + stream) * K + (segment % P) * L;
+      }
+      std::int16_t* out = arrays[stream] + group * L * N + first % N;
+      const std::size_t vectorRows = lanes == 8 ? fullRows : 0;
+      for (std::size_t k = 0; k < vectorRows; k += 8) {
+        const std::int16_t* const at[8] = {source[0] + k, source[1] + k, source[2] + k,
+                                           source[3] + k, source[4] + k, source[5] + k,
+                                           source[6] + k, source[7] + k};
+        transpose8(d8, at, out + k * N, N);
+      }
+      for (std::size_t k = vectorRows; k < L; ++k) {
+        for (std::size_t s = 0; s < lanes; ++s) out[k * N + s] = source[s][k];
+      }
+    }
+  }
+  const auto unchanged = [](auto v) { return v; };
+  std::fill_n(lu, positions, std::int16_t{0});
+  permuteSteps(d, unchanged, work, 1, laneGroups, L, sys[0], lu, sys[1]);
+  for (std::size_t b = 0; b < count; ++b) {
+    StateMetrics betas[2];
+    tailBetas(*blocks[b], betas);
+    work.tails[2 * b] = betas[0];
+    work.tails[2 * b + 1] = betas[1];
+  }
+  StateMetrics* boundaries = work.boundaries.get();
+  const std::size_t segments = work.maxSegments;
+  for (std::size_t i = 0; i < 8 * segments; ++i) boundaries[i] = StateMetrics{};
+  const StateMetrics start = knownStateZero();
+
+  const auto halfIteration = [&](const auto& combine, int decoder) {
+    StateMetrics* alphaIn = boundaries + (4 * decoder + 0) * segments;
+    StateMetrics* betaIn = boundaries + (4 * decoder + 1) * segments;
+    StateMetrics* alphaOut = boundaries + (4 * decoder + 2) * segments;
+    StateMetrics* betaOut = boundaries + (4 * decoder + 3) * segments;
+    std::int16_t* states = work.laneStates.get();
+    for (std::size_t group = 0; group < laneGroups; ++group) {
+      for (std::size_t lane = 0; lane < N; ++lane) {
+        const std::size_t s = group * N + lane;
+        const std::size_t w = s % P;
+        const bool used = s < S;
+        const StateMetrics zero{};
+        const StateMetrics& a = !used ? zero : (w == 0 ? start : alphaIn[s]);
+        const StateMetrics& bt =
+            !used ? zero : (w == P - 1 ? work.tails[2 * (s / P) + decoder] : betaIn[s + 1]);
+        for (int m = 0; m < kStates; ++m) {
+          states[m * N + lane] = a.m[m];
+          states[(8 + m) * N + lane] = bt.m[kSigma[m]];
+        }
+      }
+      const std::size_t first = group * L * N;
+      if (paired) {
+        decodeLaneGroupPaired(dPaired, combine, lu, par[decoder], L, work.alpha.get(), states,
+                              extrinsic);
+      } else {
+        decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, stride, work.alpha.get(),
+                        states, extrinsic + first);
+      }
+      for (std::size_t lane = 0; lane < N && group * N + lane < S; ++lane) {
+        const std::size_t s = group * N + lane;
+        for (int m = 0; m < kStates; ++m) {
+          alphaOut[s + 1].m[m] = states[m * N + lane];
+          betaOut[s].m[kSigma[m]] = states[(8 + m) * N + lane];
+        }
+      }
+    }
+    for (std::size_t s = 0; s < S; ++s) {
+      if (s % P != 0) {
+        alphaIn[s] = alphaOut[s];
+        betaIn[s] = betaOut[s];
+      }
+    }
+  };
+  const APriori<D> aPriori(work);
+  const auto toDecoder = [&](int decoder) {
+    permuteSteps(d, aPriori, work, decoder, laneGroups, L, extrinsic, sys[decoder], lu);
+  };
+  const auto iterate = [&](const auto& combine) {
+    std::copy_n(sys[0], positions, lu);
+    for (std::uint32_t iteration = 0; iteration < iterations; ++iteration) {
+      halfIteration(combine, 0);
+      toDecoder(1);
+      halfIteration(combine, 1);
+      if (iteration + 1 < iterations) toDecoder(0);
+    }
+  };
+  if (work.algorithm == Algorithm::LogMap) {
+    iterate(LogMapCombine{&work});
+  } else {
+    iterate(MaxCombine{});
+  }
+  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1
+  // (the saturated sum keeps the sign). lu takes the decisions, as masks of a negative sum.
+  for (std::size_t j = 0; j < positions; j += N) {
+    const auto sum = hn::SaturatedAdd(hn::Load(d, lu + j), hn::Load(d, extrinsic + j));
+    hn::Store(hn::VecFromMask(d, hn::Lt(sum, hn::Zero(d))), d, lu + j);
+  }
+  forEachValue([&](std::size_t j, std::size_t b, std::size_t i) {
+    blocks[b]->bits[pi[i]] = static_cast<std::uint8_t>(lu[j] == 0 ? 1 : 0);
+  });
+}
+
+void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
+  if (work.algorithm == Algorithm::LogMap && count * work.processingUnits == 1) {
+    // One log-MAP window fills too few lanes to pay for the vector table look-ups.
+    work.oneLane.decode(*blocks[0]);
+    return;
+  }
+  const std::size_t maxLanes = hn::Lanes(hn::ScalableTag<std::int16_t>());
+  const std::size_t lanes = laneGroupWidth(count * work.processingUnits, maxLanes);
+  if (lanes <= 8) {
+    decodeGroupWith(hn::CappedTag<std::int16_t, 8>(), hn::CappedTag<std::int16_t, 16>(), work,
+                    blocks, count);
+  } else if (lanes <= 16) {
+    decodeGroupWith(hn::CappedTag<std::int16_t, 16>(), hn::CappedTag<std::int16_t, 32>(), work,
+                    blocks, count);
+  } else {
+    const hn::CappedTag<std::int16_t, 32> d;
+    decodeGroupWith(d, d, work, blocks, count);
+  }
+}
+#endif  // HWY_TARGET == HWY_SCALAR
+
+}  // namespace HWY_NAMESPACE
+}  // namespace corvane
+HWY_AFTER_NAMESPACE();
+
+#if HWY_ONCE
+namespace corvane {
+
+HWY_EXPORT(decodeGroup);
+
+bool vectorDecoderAvailable() { return true; }
+
+bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& correction) {
+  VectorWorkspace& work = itsWork;
+  work.processingUnits = config.processingUnits;
+  work.algorithm = config.algorithm;
+  work.extrinsicLimit = (1 << (config.extrinsicBits - 1)) - 1;
+  work.thresholdCount = correction[0];
+  const int size = correction.size();
+  work.chunkCount = size <= 256 ? (size - 1 + 14) / 15 : 0;
+  const auto f = [&](int d) { return correction[d < size ? d : size - 1]; };
+  for (int c = 0; c < work.chunkCount; ++c) {
+    for (int x = 0; x < 16; ++x) {
+      work.chunkTable[16 * c + x] =
+          static_cast<std::uint8_t>(f(15 * c + std::min(x, 15)) - f(15 * c + 15));
+    }
+  }
+  for (int v = 1; v <= work.thresholdCount; ++v) {
+    int d = 0;
+    while (correction[d] >= v) ++d;
+    work.threshold[v - 1] = static_cast<std::int16_t>(d);
+  }
+  const std::size_t K = config.maxBlockSize;
+  const std::size_t P = config.processingUnits;
+  const std::size_t B = config.maxCodeBlocks;
+  work.maxSegments = B * P + 1;
+  // A group of S segments takes at most max(8, 2S) lanes of L = K / P steps (see
+  // laneGroupWidth); one lane group at most 32 lanes.
+  const std::size_t L = K / P;
+  work.positions = (B * P * 2 > 8 ? B * P * 2 : 8) * L;
+  // One lane group (alpha, or alpha and beta in the paired recursions) at most 32 lanes.
+  const std::size_t groupLanes = std::min<std::size_t>(32, std::max<std::size_t>(16, 4 * B * P));
+  const std::size_t n = work.positions;
+  bool ok = work.lu.allocate(n) && work.extrinsic.allocate(n) &&
+            work.alpha.allocate(7 * groupLanes * L) && work.laneStates.allocate(16 * 32) &&
+            work.pi.allocate(K) && work.piInverse.allocate(K) && work.received.allocate(3 * K * B);
+  for (int decoder = 0; decoder < 2; ++decoder) {
+    ok = ok && work.systematic[decoder].allocate(n) && work.parity[decoder].allocate(n) &&
+         work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L);
+  }
+  if (!ok || !work.oneLane.init(config)) return false;
+  work.boundaries.reset(new (std::nothrow) StateMetrics[8 * work.maxSegments]);
+  work.tails.reset(new (std::nothrow) StateMetrics[2 * B]);
+  itsGroup.reset(new (std::nothrow) const CodeBlock*[B]);
+  return work.boundaries != nullptr && work.tails != nullptr && itsGroup != nullptr;
+}
+
+void VectorDecoder::decode(const CodeBlock* blocks, std::uint32_t count) {
+  // Groups of equal K and iteration count, each block in the first group that fits it.
+  std::uint64_t done = 0;
+  for (std::uint32_t first = 0; first < count; ++first) {
+    if ((done >> first) & 1) continue;
+    std::size_t size = 0;
+    for (std::uint32_t b = first; b < count; ++b) {
+      if (!((done >> b) & 1) && blocks[b].row == blocks[first].row &&
+          blocks[b].iterations == blocks[first].iterations) {
+        itsGroup[size++] = &blocks[b];
+        done |= std::uint64_t{1} << b;
+      }
+    }
+    HWY_DYNAMIC_DISPATCH(decodeGroup)(itsWork, itsGroup.get(), size);
+  }
+}
+
+}  // namespace corvane
+#endif  // HWY_ONCE
+
+#else  // !CORVANE_HAVE_HIGHWAY
+
+namespace corvane {
+
+bool vectorDecoderAvailable() { return false; }
+
+bool VectorDecoder::init(const DecoderConfig&, const CorrectionTable&) { return false; }
+
+void VectorDecoder::decode(const CodeBlock*, std::uint32_t) {}
+
+}  // namespace corvane
+
+#endif  // CORVANE_HAVE_HIGHWAY
