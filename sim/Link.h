@@ -38,7 +38,7 @@ struct LinkConfig {
   std::uint32_t ackBits = 0;  // 0..2
   std::uint32_t riBits = 0;   // 0..2, PUSCH only
   std::uint32_t betaCqi = 8, betaAck = 6, betaRi = 6;  // beta-offset indices (TS 36.213 8.6.3)
-  double llrScale = 0.5;  // soft value = round(32 * llrScale * LLR), saturated
+  double llrScale = 1.0;  // soft value = round(32 * llrScale * LLR), saturated
   // Send every block maxTransmissions times, also after its CRC passed (vector files).
   bool retransmitDecoded = false;
 };

@@ -42,7 +42,7 @@ class LinkOptions {
   std::vector<std::string> itsPrb{"6"}, itsModulation{"qpsk"}, itsCp{"normal"}, itsMcs{"10"},
       itsTbs, itsRv{"0231"}, itsMaxTx{"4"}, itsIterations{"6"}, itsPu{"2"}, itsAlgorithm{"1"},
       itsCqiPu{"1"}, itsCqi{"0"}, itsAck{"0"}, itsRi{"0"};
-  double itsLlrScale = 0.5;
+  double itsLlrScale = 1.0;
 };
 
 // Parses an unsigned number, entirely; false otherwise.

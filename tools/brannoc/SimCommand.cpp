@@ -25,7 +25,7 @@ namespace fs = std::filesystem;
 
 struct SimOptions {
   LinkOptions link;
-  std::vector<std::string> snr{"1:3.5:0.25"};
+  std::vector<std::string> snr{"1:3.75:0.25"};
   std::uint64_t blocks = 10000;
   std::uint64_t errors = 100;
   std::uint64_t batch = 100;
