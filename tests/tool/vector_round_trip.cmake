@@ -1,0 +1,48 @@
+# brannoc gen, then brannoc decode, for every kind of vector: PUSCH data only, data with CQI,
+# ACK and RI (through noise), retransmissions combined with the HARQ inputs, CQI only, PUCCH
+# with either cyclic prefix, and one call to one file. Then corrupted files: each is
+# reported with its file and line, and the files after it are still decoded.
+include(${CMAKE_CURRENT_LIST_DIR}/ToolTest.cmake)
+run_tool(out gen --prb 6 --mcs 10 --out v/data)
+run_tool(out gen --prb 10 --mcs 15 --cqi 20 --ack 2 --ri 2 --snr 14 --out v/uci)
+run_tool(out gen --prb 3 --mcs 5 --blocks 2 --max-tx 3 --rv 023 --ack 1 --out v/retx)
+run_tool(out gen --tbs 0 --modulation 16qam --prb 2 --cqi 30 --ri 1 --out v/cqi)
+run_tool(out gen --channel pucch --cqi 11 --ack 2 --blocks 2 --out v/pucch)
+run_tool(out gen --channel pucch --cp extended --cqi 8 --ack 2 --out v/pucch-ext)
+run_tool(out gen --channel pucch --ack 1 --out v/ack.vec)
+expect_in("${out}" "wrote 1 vector file to v/ack.vec")
+file(GLOB retx ${WORK}/v/retx/*.vec)
+list(LENGTH retx n)
+if(NOT n EQUAL 6)
+  message(FATAL_ERROR "wanted 2 blocks of 3 transmissions, found ${retx}")
+endif()
+file(READ ${WORK}/v/retx/b0001-t3.vec last)
+expect_in("${last}" "\nSCH_RV 3\nSCH_ND 0\n.*\nsys_harq_buffer [1-9]")
+
+run_tool(out decode v/data v/uci v/retx v/cqi v/pucch v/pucch-ext v/ack.vec --out out
+         --dump dumps/ --keys 1,3)
+expect_in("${out}" "PASS v/retx/b0001-t3.vec: pusch tbs [0-9]+ rv 3 \\(combined\\)")
+expect_in("${out}" "13 vectors: 13 passed, 0 mismatched, 0 failed, 0 unreadable")
+file(READ ${WORK}/out/b0000-t1.out result)
+expect_in("${result}" "^brannoc-output 1\nstatus 0\n")
+file(GLOB dumps ${WORK}/dumps/*.log)
+if(NOT dumps)
+  message(FATAL_ERROR "no dump files written")
+endif()
+
+# A bad value on line 21 (SCH_TBSIZE), a file cut inside its soft values, a wrong expectation.
+file(MAKE_DIRECTORY ${WORK}/bad)
+file(READ ${WORK}/v/uci/b0000-t1.vec text)
+string(REGEX REPLACE "\nSCH_TBSIZE [0-9]+\n" "\nSCH_TBSIZE 12x\n" broken "${text}")
+file(WRITE ${WORK}/bad/a.vec "${broken}")
+string(SUBSTRING "${text}" 0 2000 cut)
+file(WRITE ${WORK}/bad/b.vec "${cut}")
+string(REGEX REPLACE "\nexpect.SCH_ACK_out 2\n(.)" "\nexpect.SCH_ACK_out 2\nx\\1" wrong "${text}")
+string(REPLACE "\nx0" "\n1" wrong "${wrong}")
+string(REPLACE "\nx1" "\n0" wrong "${wrong}")
+file(WRITE ${WORK}/bad/c.vec "${wrong}")
+run_tool(out decode bad v/pucch EXPECT 1)
+expect_in("${out}" "UNREADABLE bad/a.vec:21: expected an unsigned 32-bit value after 'SCH_TBSIZE', found '12x'")
+expect_in("${out}" "UNREADABLE bad/b.vec:[0-9]+: expected [0-9]+ more values of 'tb_llr' before the end of the file")
+expect_in("${out}" "MISMATCH bad/c.vec: .*differs: ACK")
+expect_in("${out}" "5 vectors: 2 passed, 1 mismatched, 0 failed, 2 unreadable")
