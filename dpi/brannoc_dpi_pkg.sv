@@ -71,5 +71,8 @@ package brannoc_dpi_pkg;
   import "DPI-C" function int brannoc_dpi_vector_expected_bit(chandle v, int which, int i);
   import "DPI-C" function int brannoc_dpi_vector_harq_size(chandle v);
   import "DPI-C" function int brannoc_dpi_vector_harq(chandle v, int stream, int i);
+  // The decoder handle's last call (shared 1: PUSCH, 0: PUCCH) as an output file of
+  // `brannoc decode --out`.
+  import "DPI-C" function int brannoc_dpi_write_output(chandle h, int shared, string path);
 
 endpackage

@@ -18,6 +18,8 @@ void brannoc_dpi_sch_push_harq(void* h, int stream, int value);
 void brannoc_dpi_cch_begin(void* h);
 void brannoc_dpi_cch_set_field(void* h, int index, unsigned value);
 void brannoc_dpi_cch_push_llr(void* h, int value);
+const vexlon_ip_brannoc_SCH_outputs* brannoc_dpi_sch_last(void* h, std::int32_t* status);
+const vexlon_ip_brannoc_CCH_outputs* brannoc_dpi_cch_last(void* h, std::int32_t* status);
 }
 
 namespace {
@@ -126,6 +128,30 @@ int brannoc_dpi_vector_harq(void* v, int stream, int i) {
     return 0;
   }
   return vector(v)->shared.harq[stream][static_cast<std::size_t>(i)];
+}
+
+// Writes the decoder handle's last shared-channel (shared 1) or control-channel (0) call to
+// path in the output-file format of `brannoc decode --out`; 1 when written, 0 (after one
+// line) when not.
+int brannoc_dpi_write_output(void* decoder, int shared, const char* path) {
+  std::int32_t status = -1;
+  std::string text;
+  if (shared != 0) {
+    const vexlon_ip_brannoc_SCH_outputs* out = brannoc_dpi_sch_last(decoder, &status);
+    if (out != nullptr) text = vf::formatSharedOutput(status, *out);
+  } else {
+    const vexlon_ip_brannoc_CCH_outputs* out = brannoc_dpi_cch_last(decoder, &status);
+    if (out != nullptr) text = vf::formatControlOutput(status, *out);
+  }
+  if (text.empty() || path == nullptr) {
+    return 0;
+  }
+  const std::string problem = vf::writeTextFile(path, text);
+  if (!problem.empty()) {
+    std::fprintf(stderr, "%s\n", problem.c_str());
+    return 0;
+  }
+  return 1;
 }
 
 }  // extern "C"

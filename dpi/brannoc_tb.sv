@@ -49,6 +49,8 @@ module brannoc_tb;
     return 0;
   endfunction
 
+  bit write_outputs = 0;
+
   function automatic int run_vector(string file, ref chandle h);
     chandle v = brannoc_dpi_vector_read(file);
     int status;
@@ -85,6 +87,7 @@ module brannoc_tb;
       bad += compare_bits(v, h, 0, CCH_CQI, 0, "CCH_data_out", file);
       bad += compare_bits(v, h, 1, CCH_ACK, 0, "CCH_ACK_out", file);
     end
+    if (write_outputs && brannoc_dpi_write_output(h, shared, {file, ".dpi.out"}) == 0) bad++;
     if (bad == 0) $display("PASS %s", file);
     brannoc_dpi_vector_free(v);
     return bad == 0 ? 0 : 1;
@@ -95,6 +98,7 @@ module brannoc_tb;
     string file;
     chandle h = null;
     int fd;
+    write_outputs = $test$plusargs("outputs");
     if (!$value$plusargs("vectors=%s", list)) begin
       $display("usage: +vectors=LIST (a file naming one vector file a line)");
       $fatal(2);

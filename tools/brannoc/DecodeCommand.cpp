@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <array>
 #include <filesystem>
+#include <map>
 #include <memory>
 
 #include "Commands.h"
@@ -124,6 +125,24 @@ std::vector<fs::path> vectorFiles(const std::vector<std::string>& paths) {
   return files;
 }
 
+// The name of a file's outputs (output file, dump prefix): its stem, or, when another file
+// of the run has the same stem, its path as given with the folder separators as '_', so
+// that files of different folders never write over each other's outputs.
+std::vector<std::string> outputNames(const std::vector<fs::path>& files) {
+  std::map<std::string, int> stems;
+  for (const fs::path& file : files) ++stems[file.stem().string()];
+  std::vector<std::string> names;
+  for (const fs::path& file : files) {
+    std::string name = file.stem().string();
+    if (stems[name] > 1) {
+      name = fs::path(file).replace_extension().relative_path().string();
+      std::replace(name.begin(), name.end(), '/', '_');
+    }
+    names.push_back(name);
+  }
+  return names;
+}
+
 bool dumpKeys(const std::vector<std::string>& items, std::vector<std::uint32_t>& keys) {
   for (const std::string& item : items) {
     std::uint32_t key = 0;
@@ -156,7 +175,9 @@ int runDecode(const DecodeOptions& o) {
   }
   Decoder decoder;
   std::size_t passed = 0, mismatched = 0, failed = 0, unreadable = 0;
-  for (const fs::path& file : files) {
+  const std::vector<std::string> names = outputNames(files);
+  for (std::size_t n = 0; n < files.size(); ++n) {
+    const fs::path& file = files[n];
     vectors::Vector vector;
     if (const std::string error = vectors::readVectorFile(file, vector); !error.empty()) {
       fmt::print("UNREADABLE {}\n", error);
@@ -177,14 +198,14 @@ int runDecode(const DecodeOptions& o) {
       ++failed;
       continue;
     }
-    const std::string dumpName = o.dump + file.stem().string() + "-";
+    const std::string dumpName = o.dump + names[n] + "-";
     for (std::uint32_t key : keys) {
       IUO_set_debugfn_state(state, key, shared ? 0 : 1, dumpName.data(),
                             static_cast<std::uint32_t>(dumpName.size()));
     }
     const Verdict v = shared ? decodeShared(state, vector.shared) : decodeControl(state, vector.control);
     if (!o.out.empty()) {
-      const fs::path out = fs::path(o.out) / (file.stem().string() + ".out");
+      const fs::path out = fs::path(o.out) / (names[n] + ".out");
       if (const std::string error = vectors::writeTextFile(out, v.output); !error.empty()) {
         fmt::print(stderr, "brannoc decode: {}\n", error);
       }
@@ -216,7 +237,8 @@ void addDecodeCommand(CLI::App& app, int& status) {
       "passed.");
   decode->add_option("paths", options->paths, "vector files, or folders of .vec files")
       ->required();
-  decode->add_option("-o,--out", options->out, "folder for the output files (<name>.out)");
+  decode->add_option("-o,--out", options->out, "folder for the output files (<name>.out; files of one name in different folders: "
+                     "<folder>_<name>.out)");
   auto* dump = decode->add_option("--dump", options->dump,
                                   "switch debug dumps on, into files <PREFIX><name>-<piece>.log");
   decode->add_option("--keys", options->keys, "dump keys 0..32, or all")
