@@ -1,7 +1,8 @@
 // The engine: a queue of block units shared by the worker threads. Every point of every
 // curve runs at once, one batch at a time; the batch's outcomes are kept by block index and
 // added in that order when its last block is done, then the stopping rule decides whether
-// the point's next batch is queued.
+// the point's next batch is queued. A run shared by several processes advances all points
+// in rounds instead, exchanging each round's outcomes (see Distribution).
 #include "sim/Sweep.h"
 
 #include <algorithm>
@@ -75,8 +76,8 @@ struct Unit {
 
 class Scheduler {
  public:
-  Scheduler(const SweepConfig& config, const ProgressFn& progress)
-      : itsConfig(config), itsProgress(progress) {
+  Scheduler(const SweepConfig& config, const ProgressFn& progress, const Distribution* distribution)
+      : itsConfig(config), itsProgress(progress), itsDistribution(distribution) {
     for (std::size_t c = 0; c < config.curves.size(); ++c) {
       for (std::size_t p = 0; p < config.snrDb.size(); ++p) {
         PointState state;
@@ -94,9 +95,12 @@ class Scheduler {
     for (std::size_t i = 0; i < itsPoints.size(); ++i) {
       if (config.maxBlocks == 0) {
         finish(i);
-      } else {
+      } else if (!distributed()) {
         queueBatch(i);
       }
+    }
+    if (distributed()) {
+      queueRound();
     }
   }
 
@@ -114,6 +118,14 @@ class Scheduler {
     std::lock_guard lock(itsMutex);
     PointState& state = itsPoints[unit.point];
     state.outcomes[unit.block - state.batchStart] = outcome;
+    if (distributed()) {
+      if (--itsRoundPending == 0) {
+        endRound();
+        queueRound();
+        itsReady.notify_all();
+      }
+      return;
+    }
     if (--state.pending > 0) return;
     for (const BlockOutcome& o : state.outcomes) {
       accumulate(state.result, o, state.maxTransmissions);
@@ -127,7 +139,17 @@ class Scheduler {
     itsReady.notify_all();
   }
 
-  void fail(const std::string& error) {
+  // A unit that could not be decoded. A distributed run completes the round (the other
+  // processes wait for its exchange) and then stops everywhere with the error.
+  void fail(const Unit& unit, const std::string& error) {
+    if (distributed()) {
+      {
+        std::lock_guard lock(itsMutex);
+        if (itsLocalError.empty()) itsLocalError = error;
+      }
+      complete(unit, BlockOutcome{});
+      return;
+    }
     std::lock_guard lock(itsMutex);
     if (itsError.empty()) itsError = error;
     itsReady.notify_all();
@@ -157,6 +179,71 @@ class Scheduler {
     --itsOpen;
   }
 
+  bool distributed() const { return itsDistribution != nullptr && itsDistribution->ranks > 1; }
+
+  // The next batch of every open point, with this process's share of its blocks queued; a
+  // round in which this process has no block is exchanged at once.
+  void queueRound() {
+    const Distribution& d = *itsDistribution;
+    while (itsOpen > 0 && itsError.empty()) {
+      itsRoundPending = 0;
+      for (std::size_t i = 0; i < itsPoints.size(); ++i) {
+        PointState& state = itsPoints[i];
+        if (state.done) continue;
+        state.batchStart = state.result.blocks;
+        const std::uint64_t end =
+            std::min(state.batchStart + std::max<std::uint64_t>(itsConfig.batchBlocks, 1),
+                     itsConfig.maxBlocks);
+        state.outcomes.assign(end - state.batchStart, BlockOutcome{});
+        for (std::uint64_t b = state.batchStart; b < end; ++b) {
+          if ((b - state.batchStart) % d.ranks == d.rank) {
+            itsQueue.push_back({i, b});
+            ++itsRoundPending;
+          }
+        }
+      }
+      if (itsRoundPending > 0) return;
+      endRound();
+    }
+  }
+
+  // Every process's outcomes of the round added in block order, the stopping rule applied.
+  void endRound() {
+    constexpr std::size_t kCounts = 7;
+    std::vector<std::uint64_t> counts;
+    std::vector<double> seconds;
+    for (const PointState& state : itsPoints) {
+      if (state.done) continue;
+      for (const BlockOutcome& o : state.outcomes) {
+        counts.insert(counts.end(), {o.transmissions, o.correct ? 1U : 0U, o.cqiErrors,
+                                     o.ackErrors, o.riErrors, o.deliveredBits, o.decodedBits});
+        seconds.push_back(o.decodeSeconds);
+      }
+    }
+    itsDistribution->sum(counts, seconds);
+    itsError = itsDistribution->firstError(itsLocalError);
+    if (!itsError.empty()) return;
+    std::size_t n = 0;
+    for (std::size_t i = 0; i < itsPoints.size(); ++i) {
+      PointState& state = itsPoints[i];
+      if (state.done) continue;
+      for (BlockOutcome& o : state.outcomes) {
+        const std::uint64_t* c = &counts[kCounts * n];
+        o.transmissions = static_cast<std::uint32_t>(c[0]);
+        o.correct = c[1] != 0;
+        o.cqiErrors = static_cast<std::uint32_t>(c[2]);
+        o.ackErrors = static_cast<std::uint32_t>(c[3]);
+        o.riErrors = static_cast<std::uint32_t>(c[4]);
+        o.deliveredBits = c[5];
+        o.decodedBits = c[6];
+        o.decodeSeconds = seconds[n++];
+        accumulate(state.result, o, state.maxTransmissions);
+      }
+      if (pointFinished(itsConfig, state.result)) finish(i);
+    }
+    if (itsProgress) itsProgress(fractionDone());
+  }
+
   // Each point counts as the larger of its shares of the block cap and of the error target.
   double fractionDone() const {
     double sum = 0;
@@ -174,6 +261,9 @@ class Scheduler {
 
   const SweepConfig& itsConfig;
   const ProgressFn& itsProgress;
+  const Distribution* itsDistribution;
+  std::uint64_t itsRoundPending = 0;  // this process's units of the round still running
+  std::string itsLocalError;          // this process's first failure, for the exchange
   std::mutex itsMutex;
   std::condition_variable itsReady;
   std::vector<PointState> itsPoints;
@@ -194,14 +284,15 @@ void work(const SweepConfig& config, Scheduler& scheduler) {
     if (!links[curve]) {
       links[curve] = std::make_unique<Link>(config.curves[curve].link);
       if (!links[curve]->open(error)) {
-        scheduler.fail(config.curves[curve].label + ": " + error);
-        return;
+        scheduler.fail(unit, config.curves[curve].label + ": " + error);
+        links[curve].reset();
+        continue;
       }
     }
     if (!links[curve]->runBlock(config.snrDb[point], blockSeed(config.seed, point, unit.block),
                                 outcome, error)) {
-      scheduler.fail(config.curves[curve].label + ": " + error);
-      return;
+      scheduler.fail(unit, config.curves[curve].label + ": " + error);
+      continue;
     }
     scheduler.complete(unit, outcome);
   }
@@ -209,7 +300,8 @@ void work(const SweepConfig& config, Scheduler& scheduler) {
 
 }  // namespace
 
-SweepResult runSweep(const SweepConfig& config, const ProgressFn& progress) {
+SweepResult runSweep(const SweepConfig& config, const ProgressFn& progress,
+                     const Distribution* distribution) {
   const auto start = std::chrono::steady_clock::now();
   // Refuse a configuration before any thread starts.
   for (const Curve& curve : config.curves) {
@@ -221,7 +313,7 @@ SweepResult runSweep(const SweepConfig& config, const ProgressFn& progress) {
       return failed;
     }
   }
-  Scheduler scheduler(config, progress);
+  Scheduler scheduler(config, progress, distribution);
   {
     std::vector<std::jthread> workers;
     for (unsigned t = 1; t < std::max(config.threads, 1u); ++t) {

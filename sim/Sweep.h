@@ -70,6 +70,22 @@ struct SweepResult {
 // fraction done (0..1), called from one thread at a time after each batch.
 using ProgressFn = std::function<void(double)>;
 
+// A sweep split across processes (the MPI build of the tool). All points advance together in
+// rounds of one batch each; within a round this process decodes the blocks whose index within
+// their batch is rank modulo ranks, with its threads. At the end of a round the processes
+// exchange the round's outcomes (those of the blocks a process did not decode are 0) and any
+// error, so that every process adds the same outcomes in block order, applies the same
+// stopping rule and stops at the same round: the counts are those of a one-process run.
+struct Distribution {
+  unsigned rank = 0;
+  unsigned ranks = 1;
+  // Sums the vectors element by element over all processes, on all of them (every process
+  // calls it at the same points with vectors of the same lengths).
+  std::function<void(std::vector<std::uint64_t>&, std::vector<double>&)> sum;
+  // The error of the lowest-ranked process that has one, on all processes ("" when none).
+  std::function<std::string(const std::string&)> firstError;
+};
+
 std::uint64_t blockSeed(std::uint64_t seed, std::uint64_t point, std::uint64_t block);
 
 // Adds one block's outcome to a point's counts.
@@ -78,8 +94,10 @@ void accumulate(PointResult& point, const BlockOutcome& outcome, std::uint32_t m
 // True when the point's counts, taken at the end of a batch, end the point.
 bool pointFinished(const SweepConfig& config, const PointResult& point);
 
-// Runs the whole sweep on config.threads threads (at least 1).
-SweepResult runSweep(const SweepConfig& config, const ProgressFn& progress = {});
+// Runs the whole sweep on config.threads threads (at least 1), in this process or, given a
+// distribution of more than one rank, shared with the other processes.
+SweepResult runSweep(const SweepConfig& config, const ProgressFn& progress = {},
+                     const Distribution* distribution = nullptr);
 
 }  // namespace brannoc::sim
 

@@ -228,7 +228,7 @@ int runDecode(const DecodeOptions& o) {
 
 }  // namespace
 
-void addDecodeCommand(CLI::App& app, int& status) {
+void addDecodeCommand(CLI::App& app, int& status, const Processes& processes) {
   auto options = std::make_shared<DecodeOptions>();
   CLI::App* decode = app.add_subcommand(
       "decode",
@@ -245,7 +245,9 @@ void addDecodeCommand(CLI::App& app, int& status) {
       ->delimiter(',')
       ->needs(dump)
       ->capture_default_str();
-  decode->callback([options, &status] { status = runDecode(*options); });
+  decode->callback([options, &status, &processes] {
+    status = processes.rank() == 0 ? runDecode(*options) : 0;
+  });
 }
 
 }  // namespace brannoc::tool

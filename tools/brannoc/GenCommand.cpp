@@ -105,7 +105,7 @@ int runGen(const GenOptions& o) {
 
 }  // namespace
 
-void addGenCommand(CLI::App& app, int& status) {
+void addGenCommand(CLI::App& app, int& status, const Processes& processes) {
   auto options = std::make_shared<GenOptions>();
   CLI::App* gen = app.add_subcommand(
       "gen",
@@ -122,7 +122,9 @@ void addGenCommand(CLI::App& app, int& status) {
   gen->add_option("-o,--out", options->out,
                   "folder for the files (b0000-t1.vec ...), or one .vec file for one call")
       ->required();
-  gen->callback([options, &status] { status = runGen(*options); });
+  gen->callback([options, &status, &processes] {
+    status = processes.rank() == 0 ? runGen(*options) : 0;
+  });
 }
 
 }  // namespace brannoc::tool

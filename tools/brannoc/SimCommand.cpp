@@ -56,7 +56,7 @@ bool snrPoints(const std::vector<std::string>& items, std::vector<double>& point
 
 std::string rate(double r) { return r < 0 ? "-" : fmt::format("{:.4f}", r); }
 
-void printTable(const sim::SweepConfig& config, const sim::SweepResult& result) {
+void printTable(const sim::SweepConfig& config, const sim::SweepResult& result, unsigned ranks) {
   const std::uint32_t n = sim::maxTransmissionsOf(config);
   for (std::size_t c = 0; c < config.curves.size(); ++c) {
     const sim::LinkConfig& l = config.curves[c].link;
@@ -88,8 +88,11 @@ void printTable(const sim::SweepConfig& config, const sim::SweepResult& result) 
     blocks += p.blocks;
     bits += p.decodedBits;
   }
-  fmt::print("\n{} blocks in {:.1f} s on {} threads ({:.2f} Mbit/s decoded in all)\n", blocks,
-             result.wallSeconds, config.threads,
+  const std::string workers = ranks > 1 ? fmt::format("{} processes of {} threads", ranks,
+                                                      config.threads)
+                                        : fmt::format("{} threads", config.threads);
+  fmt::print("\n{} blocks in {:.1f} s on {} ({:.2f} Mbit/s decoded in all)\n", blocks,
+             result.wallSeconds, workers,
              result.wallSeconds > 0 ? static_cast<double>(bits) / result.wallSeconds / 1e6 : 0.0);
 }
 
@@ -134,7 +137,7 @@ bool writeResult(const std::string& path, const std::string& text) {
   return error.empty();
 }
 
-int runSim(SimOptions& o) {
+int runSim(SimOptions& o, const Processes& processes) {
   sim::SweepConfig config;
   std::string error;
   if (!o.link.curves(config.curves, error)) {
@@ -160,14 +163,18 @@ int runSim(SimOptions& o) {
   }
   sim::SweepResult result;
   {
-    ProgressBar bar(!o.quiet);
-    result = sim::runSweep(config, [&](double fraction) { bar.update(fraction); });
+    ProgressBar bar(!o.quiet && processes.rank() == 0);
+    result = sim::runSweep(config, [&](double fraction) { bar.update(fraction); },
+                           processes.distribution());
   }
   if (!result.error.empty()) {
     fmt::print(stderr, "brannoc sim: {}\n", result.error);
     return 1;
   }
-  printTable(config, result);
+  if (processes.rank() != 0) {
+    return 0;  // rank 0 prints and writes the results of all
+  }
+  printTable(config, result, processes.ranks());
   const std::string csv = sim::formatCsv(config, result);
   bool ok = writeResult(o.csv, csv) && writeResult(o.json, sim::formatJson(config, result));
   if (ok && !o.plot.empty()) {
@@ -188,7 +195,7 @@ int runSim(SimOptions& o) {
 
 }  // namespace
 
-void addSimCommand(CLI::App& app, int& status) {
+void addSimCommand(CLI::App& app, int& status, const Processes& processes) {
   auto options = std::make_shared<SimOptions>();
   CLI::App* sim = app.add_subcommand(
       "sim",
@@ -219,7 +226,9 @@ void addSimCommand(CLI::App& app, int& status) {
   sim->add_option("--json", options->json, "write configuration, counts and speed as JSON");
   sim->add_option("--plot", options->plot, "draw BLER and throughput against SNR into this PNG");
   sim->add_flag("-q,--quiet", options->quiet, "no progress bar");
-  sim->callback([options, &status] { status = runSim(*options); });
+  sim->callback([options, &status, &processes] {
+    status = runSim(*options, processes);
+  });
 }
 
 }  // namespace brannoc::tool

@@ -10,15 +10,20 @@
 #endif
 
 int main(int argc, char** argv) {
+  const brannoc::tool::Processes processes(argc, argv);
+  if (!processes.differingCommand().empty()) {
+    std::fprintf(stderr, "brannoc: %s\n", processes.differingCommand().c_str());
+    return 2;
+  }
   try {
     CLI::App app{"brannoc: link-level simulation and test vectors for the LTE uplink channel "
                  "decoder model"};
     app.set_version_flag("--version", "brannoc " BRANNOC_VERSION);
     app.require_subcommand(1);
     int status = 0;
-    brannoc::tool::addSimCommand(app, status);
-    brannoc::tool::addGenCommand(app, status);
-    brannoc::tool::addDecodeCommand(app, status);
+    brannoc::tool::addSimCommand(app, status, processes);
+    brannoc::tool::addGenCommand(app, status, processes);
+    brannoc::tool::addDecodeCommand(app, status, processes);
     CLI11_PARSE(app, argc, argv);
     return status;
   } catch (const std::exception& e) {
