@@ -29,6 +29,8 @@
 #include <thread>
 #include <vector>
 
+#include <CLI/CLI.hpp>
+
 #include "tx/SoftChannel.h"
 #include "tx/TurboEncoder.h"
 #include "vexlon_ip_corvane_bitacc_cmodel.h"
@@ -54,62 +56,50 @@ struct Options {
   std::uint64_t seed = 1;
 };
 
-void usage() {
-  std::fprintf(stderr,
-               "usage: turbo_fer [--K n] [--algorithm 0|1|2] [--units 1|2|4|8] [--iterations n]\n"
-               "                 [--extrinsic-bits n] [--from dB] [--to dB] [--step dB]\n"
-               "                 [--errors n] [--frames n] [--scale raw-per-LLR] [--steps n]\n"
-               "                 [--path scalar|vector] [--batch n] [--threads n] [--seed n]\n");
-}
-
-std::uint32_t toU32(const char* text) {
-  return static_cast<std::uint32_t>(std::strtoul(text, nullptr, 10));
-}
-
-bool parse(int argc, char** argv, Options& o) {
-  for (int i = 1; i + 1 < argc; i += 2) {
-    const std::string name = argv[i];
-    const char* value = argv[i + 1];
-    if (name == "--K") {
-      o.K = toU32(value);
-    } else if (name == "--algorithm") {
-      o.algorithm = toU32(value);
-    } else if (name == "--units") {
-      o.units = toU32(value);
-    } else if (name == "--iterations") {
-      o.iterations = toU32(value);
-    } else if (name == "--extrinsic-bits") {
-      o.extrinsicBits = toU32(value);
-    } else if (name == "--from") {
-      o.from = std::strtod(value, nullptr);
-    } else if (name == "--to") {
-      o.to = std::strtod(value, nullptr);
-    } else if (name == "--step") {
-      o.step = std::strtod(value, nullptr);
-    } else if (name == "--errors") {
-      o.minErrors = std::strtoull(value, nullptr, 10);
-    } else if (name == "--frames") {
-      o.maxFrames = std::strtoull(value, nullptr, 10);
-    } else if (name == "--scale") {
-      o.scale = std::strtod(value, nullptr);
-    } else if (name == "--steps") {
-      o.steps = toU32(value);
-    } else if (name == "--path") {
-      const std::string path = value;
-      o.path = path == "scalar" ? 1 : (path == "vector" ? 2 : 99);
-    } else if (name == "--batch") {
-      o.batch = toU32(value);
-    } else if (name == "--threads") {
-      o.threads = toU32(value);
-    } else if (name == "--seed") {
-      o.seed = std::strtoull(value, nullptr, 10);
-    } else {
-      return false;
-    }
+// The command line on CLI11; false (after CLI11's message) when it is refused or asked for
+// help, with the exit status in status.
+bool parse(int argc, char** argv, Options& o, int& status) {
+  CLI::App app{"turbo_fer: frame error rate of the turbo-decoder model over BPSK and AWGN"};
+  app.add_option("--K", o.K, "code block size")->capture_default_str();
+  app.add_option("--algorithm", o.algorithm, "0 max-log-MAP, 1 scaled, 2 log-MAP")
+      ->check(CLI::Range(0, 2))
+      ->capture_default_str();
+  app.add_option("--units", o.units, "processing units 1, 2, 4, 8")
+      ->check(CLI::IsMember({1, 2, 4, 8}))
+      ->capture_default_str();
+  app.add_option("--iterations", o.iterations)->check(CLI::Range(1, 16))->capture_default_str();
+  app.add_option("--extrinsic-bits", o.extrinsicBits)->capture_default_str();
+  app.add_option("--from", o.from, "first Eb/N0 in dB")->capture_default_str();
+  app.add_option("--to", o.to, "last Eb/N0 in dB")->capture_default_str();
+  app.add_option("--step", o.step, "Eb/N0 step in dB")
+      ->check(CLI::PositiveNumber)
+      ->capture_default_str();
+  app.add_option("--errors", o.minErrors, "frame errors that end a point")->capture_default_str();
+  app.add_option("--frames", o.maxFrames, "frames per point at most")
+      ->check(CLI::Range(std::uint64_t{1}, std::uint64_t{100000000}))
+      ->capture_default_str();
+  app.add_option("--scale", o.scale, "raw soft-value steps per natural-log unit of the input")
+      ->check(CLI::PositiveNumber)
+      ->capture_default_str();
+  app.add_option("--steps", o.steps, "steps per unit of the log-MAP correction (default: --scale)");
+  std::string path = "automatic";
+  app.add_option("--path", path, "decoder: scalar, vector or automatic")
+      ->check(CLI::IsMember({"automatic", "scalar", "vector"}))
+      ->capture_default_str();
+  app.add_option("--batch", o.batch, "frames per call of the batch entry point")
+      ->check(CLI::Range(1, 32))
+      ->capture_default_str();
+  app.add_option("--threads", o.threads)->check(CLI::PositiveNumber)->capture_default_str();
+  app.add_option("--seed", o.seed)->capture_default_str();
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError& e) {
+    status = app.exit(e);
+    return false;
   }
+  o.path = path == "scalar" ? 1 : (path == "vector" ? 2 : 0);
   if (o.steps == 0) o.steps = static_cast<std::uint32_t>(std::lround(o.scale));
-  return argc % 2 == 1 && o.step > 0 && o.threads > 0 && o.scale > 0 && o.path != 99 &&
-         o.batch >= 1 && o.batch <= 32 && o.maxFrames >= 1 && o.maxFrames <= 100000000;
+  return true;
 }
 
 std::uint64_t mix(std::uint64_t x) {
@@ -210,9 +200,9 @@ bool runWorker(const Options& o, double esN0Db, std::uint64_t pointSeed, Counts&
 
 int main(int argc, char** argv) {
   Options o;
-  if (!parse(argc, argv, o)) {
-    usage();
-    return 2;
+  int status = 0;
+  if (!parse(argc, argv, o, status)) {
+    return status;
   }
   const double rate = static_cast<double>(o.K) / (3.0 * o.K + 12.0);
   const char* paths[] = {"automatic", "scalar", "vector"};
