@@ -17,6 +17,7 @@ Example::
 
 from __future__ import annotations
 
+import io
 import threading
 from dataclasses import astuple, dataclass
 from typing import Optional, Tuple
@@ -27,6 +28,7 @@ from . import _brannoc
 
 __all__ = [
     "BrannocError",
+    "sweep",
     "CchControl",
     "CchResult",
     "Decoder",
@@ -226,5 +228,39 @@ class Decoder:
             result, lines = self._core.set_dump(key, channel, name)
         if result == 0:
             raise BrannocError(0, lines or f"no dump key {key} on channel {channel}")
+
+def sweep(*args: str, **options: object) -> np.ndarray:
+    """Runs the link-level simulation of ``brannoc sim`` and returns its table.
+
+    Options are those of ``brannoc sim`` (``brannoc sim --help``), given as command-line
+    words (``sweep("--prb", "6", "--snr", "1:3:0.5")``) or as keywords, underscores for
+    dashes, lists for the comma lists that make several curves, True for a flag
+    (``sweep(prb=6, snr="1:3:0.5", algorithm=[0, 1], blocks=500, seed=3)``). With ``csv``
+    the same CSV file as the tool's is written. Only the counts' options and ``--csv`` take
+    effect (no table is printed, no plot drawn).
+
+    Returns:
+        A numpy structured array, one row per (curve, SNR point), with the CSV's columns:
+        curve, snr_db, blocks, transmissions, bler_1 .. bler_N (BLER after transmission n),
+        throughput_mbps, cqi_error_rate, ack_error_rate, ri_error_rate.
+
+    Raises:
+        ValueError: options the tool refuses. RuntimeError: a run that failed.
+    """
+    words = list(args)
+    for name, value in options.items():
+        flag = "--" + name.replace("_", "-")
+        if value is True:
+            words.append(flag)
+        elif value is not False and value is not None:
+            values = value if isinstance(value, (list, tuple)) else [value]
+            words += [flag, ",".join(str(v) for v in values)]
+    csv = _brannoc.sweep(words)
+    names = csv.split("\n", 1)[0].split(",")
+    counts = ("blocks", "transmissions")
+    dtype = [(n, "U128" if n == "curve" else "i8" if n in counts else "f8") for n in names]
+    return np.genfromtxt(io.StringIO(csv), delimiter=",", skip_header=1, dtype=dtype,
+                         encoding=None, ndmin=1)
+
 
 from . import tx  # noqa: E402  (the transmitter, which uses the records above)

@@ -21,6 +21,11 @@
 #include <tuple>
 #include <vector>
 
+#ifdef BRANNOC_PYTHON_SWEEP
+#include "SimOptions.h"
+#include "sim/Report.h"
+#include "vectors/VectorFile.h"
+#endif
 #include "tx/PucchTransmitter.h"
 #include "tx/PuschTransmitter.h"
 #include "tx/Segmentation.h"
@@ -298,6 +303,45 @@ py::tuple transmitPucch(const ByteArray& cqi, const ByteArray& ack, bool extende
   return py::make_tuple(soft, fields);
 }
 
+#ifdef BRANNOC_PYTHON_SWEEP
+// The simulation of `brannoc sim` with these command-line options (sweep, links, seed,
+// threads; the output options as the tool takes them): the CSV text of its counts, written to
+// the --csv file when one is given. Raises ValueError for options the tool refuses and
+// RuntimeError for a failed run.
+std::string sweep(const std::vector<std::string>& args) {
+  brannoc::tool::SimOptions options;
+  CLI::App app{"sweep"};
+  brannoc::tool::addSimOptions(app, options);
+  std::vector<std::string> reversed(args.rbegin(), args.rend());
+  try {
+    app.parse(reversed);
+  } catch (const CLI::ParseError& e) {
+    throw py::value_error(e.what());
+  }
+  brannoc::sim::SweepConfig config;
+  std::string error;
+  if (!brannoc::tool::sweepConfig(options, config, error)) {
+    throw py::value_error(error);
+  }
+  brannoc::sim::SweepResult result;
+  {
+    py::gil_scoped_release release;
+    result = brannoc::sim::runSweep(config);
+  }
+  if (!result.error.empty()) {
+    throw std::runtime_error(result.error);
+  }
+  const std::string csv = brannoc::sim::formatCsv(config, result);
+  if (!options.csv.empty()) {
+    if (const std::string problem = brannoc::vectors::writeTextFile(options.csv, csv);
+        !problem.empty()) {
+      throw std::runtime_error(problem);
+    }
+  }
+  return csv;
+}
+#endif
+
 }  // namespace
 
 PYBIND11_MODULE(_brannoc, m) {
@@ -315,4 +359,7 @@ PYBIND11_MODULE(_brannoc, m) {
       .def("set_dump", &Decoder::setDump);
   m.def("transmit_pusch", &transmitPusch);
   m.def("transmit_pucch", &transmitPucch);
+#ifdef BRANNOC_PYTHON_SWEEP
+  m.def("sweep", &sweep);
+#endif
 }

@@ -5,6 +5,7 @@ decoders in parallel threads."""
 import ctypes
 import os
 import re
+import subprocess
 import threading
 import tracemalloc
 from pathlib import Path
@@ -205,3 +206,17 @@ def test_readme_example_runs_as_written():
     blocks = re.findall(r"```python\n(.*?)```", readme.read_text(), re.S)
     assert blocks, "the README has no Python example"
     exec(compile(blocks[0], "README.md", "exec"), {})
+
+
+def test_sweep_gives_the_tools_table_and_csv(tmp_path):
+    csv = tmp_path / "py.csv"
+    table = brannoc.sweep(prb=6, snr="1:3:1", blocks=120, errors=0, seed=3, csv=str(csv))
+    assert table["blocks"].tolist() == [120, 120, 120]
+    assert table["bler_1"][0] > 0.5 > table["bler_1"][-1]
+    tool = Path(os.environ["BRANNOC_TOOL"])
+    subprocess.run([str(tool), "sim", "--prb", "6", "--snr", "1:3:1", "--blocks", "120",
+                    "--errors", "0", "--seed", "3", "--quiet", "--csv", str(tmp_path / "tool.csv")],
+                   check=True, stdout=subprocess.DEVNULL)
+    assert csv.read_text() == (tmp_path / "tool.csv").read_text()
+    with pytest.raises(ValueError):
+        brannoc.sweep(prb=0)

@@ -14,6 +14,7 @@
 #include "Commands.h"
 #include "LinkOptions.h"
 #include "Progress.h"
+#include "SimOptions.h"
 #include "sim/Report.h"
 #include "vectors/VectorFile.h"
 
@@ -22,37 +23,6 @@ namespace brannoc::tool {
 namespace {
 
 namespace fs = std::filesystem;
-
-struct SimOptions {
-  LinkOptions link;
-  std::vector<std::string> snr{"1:3.75:0.25"};
-  std::uint64_t blocks = 10000;
-  std::uint64_t errors = 100;
-  std::uint64_t batch = 100;
-  std::uint64_t seed = 1;
-  unsigned threads = std::max(1u, std::thread::hardware_concurrency());
-  std::string out, csv, json, plot;
-  bool quiet = false;
-};
-
-// "a:b:step" from a to b, or a single value; false when unreadable.
-bool snrPoints(const std::vector<std::string>& items, std::vector<double>& points) {
-  for (const std::string& item : items) {
-    double from = 0, to = 0, step = 1;
-    char tail = 0;
-    if (std::sscanf(item.c_str(), "%lf:%lf:%lf%c", &from, &to, &step, &tail) == 3) {
-      if (!(step > 0) || !(to >= from) || (to - from) / step > 1000) return false;
-      for (int i = 0; from + i * step <= to + step * 1e-6; ++i) {
-        points.push_back(std::round((from + i * step) * 1e6) / 1e6);
-      }
-    } else if (std::sscanf(item.c_str(), "%lf%c", &from, &tail) == 1 && std::isfinite(from)) {
-      points.push_back(from);
-    } else {
-      return false;
-    }
-  }
-  return !points.empty();
-}
 
 std::string rate(double r) { return r < 0 ? "-" : fmt::format("{:.4f}", r); }
 
@@ -72,7 +42,8 @@ void printTable(const sim::SweepConfig& config, const sim::SweepResult& result, 
       if (p.curve != c) continue;
       std::string row = fmt::format("{:>7.2f} {:>7}", p.snrDb, p.blocks);
       for (std::uint32_t k = 0; k < n; ++k) {
-        row += k < p.failedAfter.size() ? fmt::format(" {:>8.4f}", p.bler(k)) : fmt::format(" {:>8}", "");
+        row += k < p.failedAfter.size() ? fmt::format(" {:>8.4f}", p.bler(k))
+                                        : fmt::format(" {:>8}", "");
       }
       row += fmt::format(" {:>8.3f}", p.throughputMbps());
       if (uci) {
@@ -88,9 +59,9 @@ void printTable(const sim::SweepConfig& config, const sim::SweepResult& result, 
     blocks += p.blocks;
     bits += p.decodedBits;
   }
-  const std::string workers = ranks > 1 ? fmt::format("{} processes of {} threads", ranks,
-                                                      config.threads)
-                                        : fmt::format("{} threads", config.threads);
+  const std::string workers = ranks > 1
+                                  ? fmt::format("{} processes of {} threads", ranks, config.threads)
+                                  : fmt::format("{} threads", config.threads);
   fmt::print("\n{} blocks in {:.1f} s on {} ({:.2f} Mbit/s decoded in all)\n", blocks,
              result.wallSeconds, workers,
              result.wallSeconds > 0 ? static_cast<double>(bits) / result.wallSeconds / 1e6 : 0.0);
@@ -107,7 +78,7 @@ bool plot(const std::string& csv, const std::string& png) {
     return false;
   }
   const char* chosen = std::getenv("BRANNOC_PYTHON");
-  std::string python = chosen != nullptr ? chosen
+  std::string python = chosen != nullptr                ? chosen
                        : fs::exists("/usr/bin/python3") ? "/usr/bin/python3"
                                                         : "python3";
   std::string path = script.string(), in = csv, out = png;
@@ -139,20 +110,10 @@ bool writeResult(const std::string& path, const std::string& text) {
 
 int runSim(SimOptions& o, const Processes& processes) {
   sim::SweepConfig config;
-  std::string error;
-  if (!o.link.curves(config.curves, error)) {
+  if (std::string error; !sweepConfig(o, config, error)) {
     fmt::print(stderr, "brannoc sim: {}\n", error);
     return 2;
   }
-  if (!snrPoints(o.snr, config.snrDb)) {
-    fmt::print(stderr, "brannoc sim: --snr takes values and ranges FROM:TO:STEP (STEP > 0)\n");
-    return 2;
-  }
-  config.maxBlocks = o.blocks;
-  config.targetErrors = o.errors;
-  config.batchBlocks = o.batch;
-  config.seed = o.seed;
-  config.threads = o.threads;
   if (!o.out.empty()) {
     const auto inOut = [&](std::string& path, const char* name) {
       if (path.empty()) path = (fs::path(o.out) / name).string();
@@ -164,8 +125,8 @@ int runSim(SimOptions& o, const Processes& processes) {
   sim::SweepResult result;
   {
     ProgressBar bar(!o.quiet && processes.rank() == 0);
-    result = sim::runSweep(config, [&](double fraction) { bar.update(fraction); },
-                           processes.distribution());
+    result = sim::runSweep(
+        config, [&](double fraction) { bar.update(fraction); }, processes.distribution());
   }
   if (!result.error.empty()) {
     fmt::print(stderr, "brannoc sim: {}\n", result.error);
@@ -202,33 +163,8 @@ void addSimCommand(CLI::App& app, int& status, const Processes& processes) {
       "Link-level simulation over AWGN: BLER after each transmission, throughput and UCI "
       "error rates against SNR (Es/N0 of the modulation symbols). Every option that takes "
       "a list runs one curve per combination of its values.");
-  options->link.add(*sim);
-  sim->add_option("--snr", options->snr, "SNR points in dB: values and FROM:TO:STEP ranges")
-      ->delimiter(',')
-      ->capture_default_str();
-  sim->add_option("--blocks", options->blocks, "transport blocks per point at most")
-      ->capture_default_str();
-  sim->add_option("--errors", options->errors,
-                  "first-transmission block errors that end a point (checked after each batch; "
-                  "0: always --blocks)")
-      ->capture_default_str();
-  sim->add_option("--batch", options->batch, "blocks between two checks of --errors")
-      ->check(CLI::PositiveNumber)
-      ->capture_default_str();
-  sim->add_option("--threads", options->threads, "worker threads")
-      ->check(CLI::Range(1u, 256u))
-      ->capture_default_str();
-  sim->add_option("--seed", options->seed, "seed of every payload and noise draw")
-      ->capture_default_str();
-  sim->add_option("-o,--out", options->out,
-                  "folder for bler.csv, bler.json and bler.png (unless given one by one)");
-  sim->add_option("--csv", options->csv, "write the counts as CSV to this file");
-  sim->add_option("--json", options->json, "write configuration, counts and speed as JSON");
-  sim->add_option("--plot", options->plot, "draw BLER and throughput against SNR into this PNG");
-  sim->add_flag("-q,--quiet", options->quiet, "no progress bar");
-  sim->callback([options, &status, &processes] {
-    status = runSim(*options, processes);
-  });
+  addSimOptions(*sim, *options);
+  sim->callback([options, &status, &processes] { status = runSim(*options, processes); });
 }
 
 }  // namespace brannoc::tool
