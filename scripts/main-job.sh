@@ -5,7 +5,7 @@
 set -euo pipefail
 cd "$(dirname "$0")/.."
 scripts/install-packages.sh g++ cmake make googletest libbenchmark-dev libhwy-dev libcli11-dev \
-  libfmt-dev nlohmann-json3-dev python3-matplotlib
+  libfmt-dev nlohmann-json3-dev python3-matplotlib libopenmpi-dev openmpi-bin
 cmake --preset release >/dev/null
 cmake --build --preset release -j "$(nproc)" --target brannoc
 build/release/tools/brannoc/brannoc sim --out results "$@"
