@@ -2,6 +2,7 @@
 #include "Processes.h"
 
 #include <cstdio>
+#include <cstdlib>
 #include <vector>
 
 #ifdef BRANNOC_WITH_MPI
@@ -43,8 +44,13 @@ std::string firstAcross(const std::string& error, int rank, int ranks) {
 Processes::Processes(int& argc, char**& argv) {
 #ifdef BRANNOC_WITH_MPI
   int provided = 0;
+  // MPI only under a launcher (mpirun sets OMPI_COMM_WORLD_SIZE, PMIx launchers PMIX_RANK):
+  // a plain start would make Open MPI start its daemon, half a second for every command.
   // Worker threads make the exchange one at a time, from whichever finishes a round.
-  if (MPI_Init_thread(&argc, &argv, MPI_THREAD_SERIALIZED, &provided) == MPI_SUCCESS) {
+  const bool launched = std::getenv("OMPI_COMM_WORLD_SIZE") != nullptr ||
+                        std::getenv("PMIX_RANK") != nullptr || std::getenv("PMI_RANK") != nullptr;
+  if (launched &&
+      MPI_Init_thread(&argc, &argv, MPI_THREAD_SERIALIZED, &provided) == MPI_SUCCESS) {
     itsStarted = true;
     int rank = 0, ranks = 1;
     MPI_Comm_rank(MPI_COMM_WORLD, &rank);
