@@ -51,14 +51,7 @@ struct SchCall {
     cw = other.cw;
     harqOut = other.harqOut;
     outputs = other.outputs;
-    outputs.SCH_data_out = data.data();
-    outputs.SCH_ACK_out = ack.data();
-    outputs.SCH_RI_out = ri.data();
-    outputs.SCH_CQI_out = cqi.data();
-    outputs.sys_harq_buffer = harqOut[0].data();
-    outputs.p0_harq_buffer = harqOut[1].data();
-    outputs.p1_harq_buffer = harqOut[2].data();
-    outputs.CW_CRC_out = cw.data();
+    bindArrays();
     return *this;
   }
 
@@ -72,6 +65,16 @@ struct SchCall {
     cw.assign(64, 9);
     for (auto& h : harqOut) h.assign(cap(harqCapacity), 0);
     outputs = {};
+    bindArrays();
+    outputs.max_harq_buffer_size = harqCapacity;
+    outputs.max_SCH_data_out_size = static_cast<std::uint32_t>(data.size());
+    outputs.max_SCH_ACK_out_size = static_cast<std::uint32_t>(ack.size());
+    outputs.max_SCH_RI_out_size = static_cast<std::uint32_t>(ri.size());
+    outputs.max_SCH_CQI_out_size = static_cast<std::uint32_t>(cqi.size());
+    outputs.max_CW_CRC_out_size = static_cast<std::uint32_t>(cw.size());
+  }
+
+  void bindArrays() {
     outputs.SCH_data_out = data.data();
     outputs.SCH_ACK_out = ack.data();
     outputs.SCH_RI_out = ri.data();
@@ -80,12 +83,6 @@ struct SchCall {
     outputs.p0_harq_buffer = harqOut[1].data();
     outputs.p1_harq_buffer = harqOut[2].data();
     outputs.CW_CRC_out = cw.data();
-    outputs.max_harq_buffer_size = harqCapacity;
-    outputs.max_SCH_data_out_size = static_cast<std::uint32_t>(data.size());
-    outputs.max_SCH_ACK_out_size = static_cast<std::uint32_t>(ack.size());
-    outputs.max_SCH_RI_out_size = static_cast<std::uint32_t>(ri.size());
-    outputs.max_SCH_CQI_out_size = static_cast<std::uint32_t>(cqi.size());
-    outputs.max_CW_CRC_out_size = static_cast<std::uint32_t>(cw.size());
   }
 
   // An empty array is passed as a null pointer.
