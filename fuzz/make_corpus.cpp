@@ -2,7 +2,8 @@
 // kind from the transmitter (PUSCH with and without UCI, retransmissions, CQI only, PUCCH
 // with and without ACK, both cyclic prefixes), and from each of them the calls of the
 // status-code tests (each control field one step past its limit, null and short arrays).
-// Usage: make_corpus FOLDER (creates FOLDER/sch, FOLDER/cch, FOLDER/dump, FOLDER/corvane).
+// Usage: make_corpus FOLDER (creates FOLDER/sch, FOLDER/cch, FOLDER/dump, FOLDER/corvane,
+// FOLDER/vector).
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>
@@ -15,6 +16,7 @@
 #include "tx/PucchTransmitter.h"
 #include "tx/PuschTransmitter.h"
 #include "tx/TurboEncoder.h"
+#include "vectors/VectorFile.h"
 
 namespace {
 
@@ -27,6 +29,12 @@ void writeFile(const std::filesystem::path& folder, const std::string& name,
   std::ofstream file(folder / name, std::ios::binary);
   file.write(reinterpret_cast<const char*>(out.bytes().data()),
              static_cast<std::streamsize>(out.bytes().size()));
+}
+
+void writeText(const std::filesystem::path& folder, const std::string& name,
+               const std::string& text) {
+  std::filesystem::create_directories(folder);
+  std::ofstream(folder / name, std::ios::binary) << text;
 }
 
 tx::Bits pattern(std::size_t n, unsigned salt) {
@@ -103,6 +111,15 @@ int main(int argc, char** argv) {
     fz::FuzzOutput valid;
     call.write(valid);
     writeFile(root / "sch", base, valid);
+    // The same call as a vector file, for the reader's harness.
+    brannoc::vectors::Vector vector;
+    vector.generics = call.generics;
+    vector.shared.control = call.control;
+    vector.shared.maxHarqBufferSize = call.capacities[0];
+    vector.shared.llr = call.llr;
+    vector.shared.harq = call.harqIn;
+    vector.shared.data = pattern(s.tb, 1);
+    writeText(root / "vector", base + ".vec", brannoc::vectors::formatVector(vector));
     // The same call past each control field's limit (SCH_TAG has none), and with each
     // pointer null.
     const std::uint32_t pastLimit[23] = {4096, 128, 16, 256, 3, 256, 3, 128, 2048, 2, 65536, 65536,
@@ -143,6 +160,15 @@ int main(int argc, char** argv) {
       fz::FuzzOutput out;
       call.write(out);
       writeFile(root / "cch", "cch-" + std::to_string(n), out);
+      brannoc::vectors::Vector vector;
+      vector.channel = brannoc::vectors::Channel::Control;
+      vector.generics = call.generics;
+      vector.control.control = call.control;
+      vector.control.llr = call.llr;
+      vector.control.cqi = pattern(cqi, 5);
+      vector.control.ack = pattern(ack, 6);
+      writeText(root / "vector", "cch-" + std::to_string(n) + ".vec",
+                brannoc::vectors::formatVector(vector));
       // The dump harness: two switches (a control-channel and a shared-channel key), then
       // the same call.
       fz::FuzzOutput dump;
