@@ -1,7 +1,9 @@
 // libFuzzer harness of IUO_set_debugfn_state: up to four switches (key, channel, name bytes
 // with zero bytes included) on one instance, then a control-channel and a shared-channel
-// decode that write the dumps, all in a scratch folder emptied after each input. A '/' in a
-// name becomes '_', so that no input writes outside the scratch folder.
+// decode that write the dumps, all in a scratch folder emptied after each input. Every name
+// starts with the scratch folder's path and a '/' in the fuzzed part becomes '_', so that no
+// input writes outside the folder. The harness never changes the working directory: libFuzzer
+// reads and writes its corpus by the paths it was given.
 //
 // Input: switch count byte; per switch a key word, a channel byte, a name length byte and the
 // name; then a control-channel call (layout in FuzzCalls.h).
@@ -17,13 +19,25 @@
 
 namespace {
 
+// The scratch folder's path, kept in a plain array so that the exit handler that removes the
+// (by then empty) folder never outlives it.
+char scratchName[4096];
+
+void removeScratch() { rmdir(scratchName); }
+
 const std::filesystem::path& scratch() {
   static const std::filesystem::path folder = [] {
-    std::string name = (std::filesystem::temp_directory_path() / "brannoc-dump-fuzz-XXXXXX").string();
-    if (mkdtemp(name.data()) == nullptr || chdir(name.c_str()) != 0) {
+    const std::string name =
+        (std::filesystem::temp_directory_path() / "brannoc-dump-fuzz-XXXXXX").string();
+    if (name.size() >= sizeof scratchName) {
       std::abort();
     }
-    return std::filesystem::path(name);
+    name.copy(scratchName, name.size());
+    if (mkdtemp(scratchName) == nullptr) {
+      std::abort();
+    }
+    std::atexit(removeScratch);
+    return std::filesystem::path(scratchName);
   }();
   return folder;
 }
@@ -68,10 +82,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   for (int n = 0; n < switches; ++n) {
     const std::uint32_t key = in.word();
     const std::uint32_t channel = in.byte();
-    std::string name(in.byte() % 48, '\0');
-    for (char& c : name) {
-      c = static_cast<char>(in.byte());
-      c = c == '/' ? '_' : c;
+    std::string name = scratch().string() + '/';
+    for (std::uint8_t length = in.byte() % 48; length > 0; --length) {
+      const char c = static_cast<char>(in.byte());
+      name += c == '/' ? '_' : c;
     }
     const std::uint32_t result = IUO_set_debugfn_state(
         state, key, channel, name.data(), static_cast<std::uint32_t>(name.size()));
