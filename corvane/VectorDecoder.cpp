@@ -234,32 +234,25 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
   }
 }
 
-// The a priori value of a raw extrinsic value: scaled by 0.75 for scaled max-log-MAP (the
-// product rounded as ScaledMaxLogPolicy does), saturated to the extrinsic width. The raw
-// value is first limited to +-2047, which changes no result (0.75 * 2047 exceeds every
-// extrinsic limit) and keeps 3e within 16 bits.
+// The a priori value of a raw extrinsic value e: scaled by 0.75 for scaled max-log-MAP,
+// rounded half away from zero as ScaledMaxLogPolicy does, (3|e| + 2) >> 2 = (|e| * 24576 +
+// 16384) >> 15 with e's sign, then saturated to the extrinsic width.
 template <class D>
 struct APriori {
   using V = decltype(hn::Zero(D()));
-  V limit, negativeLimit, bound, negativeBound, two;
+  V limit, negativeLimit, threeQuarters;
   bool scaled;
   explicit APriori(const VectorWorkspace& work) {
     const D d;
     limit = hn::Set(d, static_cast<std::int16_t>(work.extrinsicLimit));
     negativeLimit = hn::Neg(limit);
-    bound = hn::Set(d, 2047);
-    negativeBound = hn::Neg(bound);
-    two = hn::Set(d, 2);
+    threeQuarters = hn::Set(d, 24576);
     scaled = work.algorithm == Algorithm::ScaledMaxLog;
   }
   HWY_INLINE V operator()(V e) const {
-    const D d;
     if (scaled) {
-      e = hn::Min(hn::Max(e, negativeBound), bound);
-      const V triple = hn::Add(hn::Add(e, e), e);
-      // (3e + 2 - [3e < 0]) >> 2: the mask of 3e < 0 is -1.
-      e = hn::ShiftRight<2>(
-          hn::Add(hn::Add(triple, two), hn::VecFromMask(d, hn::Lt(triple, hn::Zero(d)))));
+      const V magnitude = hn::MulFixedPoint15(hn::Abs(e), threeQuarters);
+      e = hn::IfNegativeThenElse(e, hn::Neg(magnitude), magnitude);
     }
     return hn::Min(hn::Max(e, negativeLimit), limit);
   }
@@ -268,12 +261,12 @@ struct APriori {
 // Carries values of one decoder's order into the other's: the value for step k of every
 // window comes from step source[k] of the same lane group, its lanes rearranged within each
 // block's windows by pattern[k] (16 byte indices, repeated in every 128-bit block: the P
-// windows of a block share one 128-bit block, P dividing 8). out = add + transform(moved).
-template <class D, class Transform>
-HWY_NOINLINE void permuteSteps(D d, const Transform& transform, const VectorWorkspace& work,
+// windows of a block share one 128-bit block, P dividing 8). The vector stored at position
+// j (step k) is output(moved, j).
+template <class D, class Output>
+HWY_NOINLINE void permuteSteps(D d, const Output& output, const VectorWorkspace& work,
                                int toDecoder, std::size_t laneGroups, std::size_t L,
                                const std::int16_t* HWY_RESTRICT from,
-                               const std::int16_t* HWY_RESTRICT add,
                                std::int16_t* HWY_RESTRICT out) {
   const std::size_t N = hn::Lanes(d);
   const hn::Repartition<std::uint8_t, D> bytes;
@@ -289,47 +282,25 @@ HWY_NOINLINE void permuteSteps(D d, const Transform& transform, const VectorWork
             hn::TableLookupBytes(moved, hn::BitCast(d, hn::LoadDup128(bytes, pattern + 16 * k)));
       }
       const std::size_t at = first + k * N;
-      hn::Store(hn::Add(hn::Load(d, add + at), transform(moved)), d, out + at);
+      hn::Store(output(moved, at), d, out + at);
     }
   }
 }
 
-// out[i] = in[i] saturated to -128..127, the received soft values' range.
-template <class D>
-HWY_NOINLINE void saturateSoftValues(D /* d */, const std::int32_t* in, std::int16_t* out,
-                                     std::size_t count) {
-  const hn::Repartition<std::int32_t, D> d32;
-  const hn::Rebind<std::int16_t, decltype(d32)> d16;
-  const std::size_t M = hn::Lanes(d32);
-  const auto low = hn::Set(d16, -128);
-  const auto high = hn::Set(d16, 127);
-  std::size_t i = 0;
-  for (; i + M <= count; i += M) {
-    hn::StoreU(hn::Min(hn::Max(hn::DemoteTo(d16, hn::LoadU(d32, in + i)), low), high), d16,
-               out + i);
-  }
-  for (; i < count; ++i) out[i] = softValue(in[i]);
-}
-
-// out[t * stride + s] = source[s][t] for s, t in 0..7: eight values of eight segments
-// transposed into eight rows (16-bit, 32-bit and 64-bit interleaves).
-template <class D8>
-HWY_INLINE void transpose8(D8 d8, const std::int16_t* const (&source)[8], std::int16_t* out,
-                           std::size_t stride) {
+// Eight vectors of eight 16-bit lanes transposed in place: vector t becomes lane t of every
+// input (16-bit, 32-bit and 64-bit interleaves).
+template <class D8, class V>
+HWY_INLINE void transpose8(D8 d8, V (&r)[8]) {
   const hn::Repartition<std::int32_t, D8> d32;
   const hn::Repartition<std::int64_t, D8> d64;
-  const auto r0 = hn::LoadU(d8, source[0]), r1 = hn::LoadU(d8, source[1]);
-  const auto r2 = hn::LoadU(d8, source[2]), r3 = hn::LoadU(d8, source[3]);
-  const auto r4 = hn::LoadU(d8, source[4]), r5 = hn::LoadU(d8, source[5]);
-  const auto r6 = hn::LoadU(d8, source[6]), r7 = hn::LoadU(d8, source[7]);
-  const auto t0 = hn::BitCast(d32, hn::InterleaveLower(d8, r0, r1));
-  const auto t1 = hn::BitCast(d32, hn::InterleaveUpper(d8, r0, r1));
-  const auto t2 = hn::BitCast(d32, hn::InterleaveLower(d8, r2, r3));
-  const auto t3 = hn::BitCast(d32, hn::InterleaveUpper(d8, r2, r3));
-  const auto t4 = hn::BitCast(d32, hn::InterleaveLower(d8, r4, r5));
-  const auto t5 = hn::BitCast(d32, hn::InterleaveUpper(d8, r4, r5));
-  const auto t6 = hn::BitCast(d32, hn::InterleaveLower(d8, r6, r7));
-  const auto t7 = hn::BitCast(d32, hn::InterleaveUpper(d8, r6, r7));
+  const auto t0 = hn::BitCast(d32, hn::InterleaveLower(d8, r[0], r[1]));
+  const auto t1 = hn::BitCast(d32, hn::InterleaveUpper(d8, r[0], r[1]));
+  const auto t2 = hn::BitCast(d32, hn::InterleaveLower(d8, r[2], r[3]));
+  const auto t3 = hn::BitCast(d32, hn::InterleaveUpper(d8, r[2], r[3]));
+  const auto t4 = hn::BitCast(d32, hn::InterleaveLower(d8, r[4], r[5]));
+  const auto t5 = hn::BitCast(d32, hn::InterleaveUpper(d8, r[4], r[5]));
+  const auto t6 = hn::BitCast(d32, hn::InterleaveLower(d8, r[6], r[7]));
+  const auto t7 = hn::BitCast(d32, hn::InterleaveUpper(d8, r[6], r[7]));
   const auto u0 = hn::BitCast(d64, hn::InterleaveLower(d32, t0, t2));
   const auto u1 = hn::BitCast(d64, hn::InterleaveUpper(d32, t0, t2));
   const auto u2 = hn::BitCast(d64, hn::InterleaveLower(d32, t1, t3));
@@ -338,14 +309,22 @@ HWY_INLINE void transpose8(D8 d8, const std::int16_t* const (&source)[8], std::i
   const auto u5 = hn::BitCast(d64, hn::InterleaveUpper(d32, t4, t6));
   const auto u6 = hn::BitCast(d64, hn::InterleaveLower(d32, t5, t7));
   const auto u7 = hn::BitCast(d64, hn::InterleaveUpper(d32, t5, t7));
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u0, u4)), d8, out + 0 * stride);
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u0, u4)), d8, out + 1 * stride);
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u1, u5)), d8, out + 2 * stride);
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u1, u5)), d8, out + 3 * stride);
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u2, u6)), d8, out + 4 * stride);
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u2, u6)), d8, out + 5 * stride);
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveLower(d64, u3, u7)), d8, out + 6 * stride);
-  hn::StoreU(hn::BitCast(d8, hn::InterleaveUpper(d64, u3, u7)), d8, out + 7 * stride);
+  r[0] = hn::BitCast(d8, hn::InterleaveLower(d64, u0, u4));
+  r[1] = hn::BitCast(d8, hn::InterleaveUpper(d64, u0, u4));
+  r[2] = hn::BitCast(d8, hn::InterleaveLower(d64, u1, u5));
+  r[3] = hn::BitCast(d8, hn::InterleaveUpper(d64, u1, u5));
+  r[4] = hn::BitCast(d8, hn::InterleaveLower(d64, u2, u6));
+  r[5] = hn::BitCast(d8, hn::InterleaveUpper(d64, u2, u6));
+  r[6] = hn::BitCast(d8, hn::InterleaveLower(d64, u3, u7));
+  r[7] = hn::BitCast(d8, hn::InterleaveUpper(d64, u3, u7));
+}
+
+// Eight received soft values from in, saturated to -128..127.
+template <class D8>
+HWY_INLINE auto loadSoftValues(D8 d8, const std::int32_t* in) {
+  const hn::Repartition<std::int32_t, D8> d32;
+  const auto wide = hn::ReorderDemote2To(d8, hn::LoadU(d32, in), hn::LoadU(d32, in + 4));
+  return hn::Min(hn::Max(wide, hn::Set(d8, -128)), hn::Set(d8, 127));
 }
 
 // The tables of permuteSteps for the group's K, from the QPP permutation: Pi(w*L + k) is
@@ -394,67 +373,48 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   const std::size_t stride = 7 * N * L * sizeof(std::int16_t) > (std::size_t{1} << 20) ? 2 : 1;
   if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
 
-  const std::uint16_t* pi = work.pi.get();
   std::int16_t* sys[2] = {work.systematic[0].get(), work.systematic[1].get()};
   std::int16_t* par[2] = {work.parity[0].get(), work.parity[1].get()};
   std::int16_t* lu = work.lu.get();
   std::int16_t* extrinsic = work.extrinsic.get();
-  // Every value of the group in array order (so that the array accesses stream): block b's
-  // window w is segment s = b*P + w, in lane s % N of lane group s / N (a lane group holds
-  // N / P whole blocks); lanes without a segment hold zeros.
-  const auto forEachValue = [&](const auto& visit) {
-    for (std::size_t group = 0; group < laneGroups; ++group) {
-      const std::size_t firstBlock = group * (N / P);
-      const std::size_t groupBlocks = std::min(N / P, count - firstBlock);
-      for (std::size_t k = 0; k < L; ++k) {
-        std::size_t j = (group * L + k) * N;
-        for (std::size_t b = firstBlock; b < firstBlock + groupBlocks; ++b) {
-          for (std::size_t i = k; i < K; i += L) visit(j++, b, i);
-        }
-      }
-    }
-  };
+  // Block b's window w is segment s = b*P + w, in lane s % N of lane group s / N (a lane
+  // group holds N / P whole blocks); lanes without a segment hold zeros. Values move between
+  // the blocks' arrays and the lanes eight segments by eight steps at a time, transposed in
+  // registers, and the rest one by one.
   if (S % N != 0) {
     std::fill_n(sys[0], positions, std::int16_t{0});
     std::fill_n(par[0], positions, std::int16_t{0});
     std::fill_n(par[1], positions, std::int16_t{0});
   }
-  // Streams d0, d1, d2 of block b saturated at received + (3b + stream) * K.
-  std::int16_t* received = work.received.get();
-  for (std::size_t b = 0; b < count; ++b) {
-    saturateSoftValues(d, blocks[b]->d0, received + (3 * b) * K, K);
-    saturateSoftValues(d, blocks[b]->d1, received + (3 * b + 1) * K, K);
-    saturateSoftValues(d, blocks[b]->d2, received + (3 * b + 2) * K, K);
-  }
-  // Into the lanes: eight segments by eight steps at a time, the rest value by value.
   const hn::CappedTag<std::int16_t, 8> d8;
-  std::int16_t* arrays[3] = {sys[0], par[0], par[1]};
+  using V8 = decltype(hn::Zero(d8));
   const std::size_t fullRows = L - L % 8;
+  // Into the lanes: d0, d1, d2 of every block, saturated to -128..127.
+  std::int16_t* arrays[3] = {sys[0], par[0], par[1]};
   for (std::size_t first = 0; first < S; first += 8) {
-    const std::size_t group = first / N;
     const std::size_t lanes = std::min<std::size_t>(8, S - first);
     for (int stream = 0; stream < 3; ++stream) {
-      const std::int16_t* source[8];
+      const std::int32_t* source[8];
       for (std::size_t s = 0; s < lanes; ++s) {
-        const std::size_t segment = first + s;
-        source[s] = received + (3 * (segment / P) + stream) * K + (segment % P) * L;
+        const CodeBlock& block = *blocks[(first + s) / P];
+        const std::int32_t* streams[3] = {block.d0, block.d1, block.d2};
+        source[s] = streams[stream] + (first + s) % P * L;
       }
-      std::int16_t* out = arrays[stream] + group * L * N + first % N;
+      std::int16_t* out = arrays[stream] + first / N * L * N + first % N;
       const std::size_t vectorRows = lanes == 8 ? fullRows : 0;
       for (std::size_t k = 0; k < vectorRows; k += 8) {
-        const std::int16_t* const at[8] = {source[0] + k, source[1] + k, source[2] + k,
-                                           source[3] + k, source[4] + k, source[5] + k,
-                                           source[6] + k, source[7] + k};
-        transpose8(d8, at, out + k * N, N);
+        V8 r[8];
+        for (int s = 0; s < 8; ++s) r[s] = loadSoftValues(d8, source[s] + k);
+        transpose8(d8, r);
+        for (int t = 0; t < 8; ++t) hn::StoreU(r[t], d8, out + (k + t) * N);
       }
       for (std::size_t k = vectorRows; k < L; ++k) {
-        for (std::size_t s = 0; s < lanes; ++s) out[k * N + s] = source[s][k];
+        for (std::size_t s = 0; s < lanes; ++s) out[k * N + s] = softValue(source[s][k]);
       }
     }
   }
-  const auto unchanged = [](auto v) { return v; };
-  std::fill_n(lu, positions, std::int16_t{0});
-  permuteSteps(d, unchanged, work, 1, laneGroups, L, sys[0], lu, sys[1]);
+  const auto copy = [](auto moved, std::size_t) { return moved; };
+  permuteSteps(d, copy, work, 1, laneGroups, L, sys[0], sys[1]);
   for (std::size_t b = 0; b < count; ++b) {
     StateMetrics betas[2];
     tailBetas(*blocks[b], betas);
@@ -511,7 +471,11 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   };
   const APriori<D> aPriori(work);
   const auto toDecoder = [&](int decoder) {
-    permuteSteps(d, aPriori, work, decoder, laneGroups, L, extrinsic, sys[decoder], lu);
+    const std::int16_t* systematic = sys[decoder];
+    const auto aPrioriPlusSystematic = [&](auto moved, std::size_t at) {
+      return hn::Add(hn::Load(d, systematic + at), aPriori(moved));
+    };
+    permuteSteps(d, aPrioriPlusSystematic, work, decoder, laneGroups, L, extrinsic, lu);
   };
   const auto iterate = [&](const auto& combine) {
     std::copy_n(sys[0], positions, lu);
@@ -527,15 +491,36 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   } else {
     iterate(MaxCombine{});
   }
-  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1
-  // (the saturated sum keeps the sign). lu takes the decisions, as masks of a negative sum.
+  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1.
+  // The decisions, 1 + (sum >> 15), go into natural order in lu, then out of the lanes.
   for (std::size_t j = 0; j < positions; j += N) {
-    const auto sum = hn::SaturatedAdd(hn::Load(d, lu + j), hn::Load(d, extrinsic + j));
-    hn::Store(hn::VecFromMask(d, hn::Lt(sum, hn::Zero(d))), d, lu + j);
+    hn::Store(hn::Add(hn::Load(d, lu + j), hn::Load(d, extrinsic + j)), d, extrinsic + j);
   }
-  forEachValue([&](std::size_t j, std::size_t b, std::size_t i) {
-    blocks[b]->bits[pi[i]] = static_cast<std::uint8_t>(lu[j] == 0 ? 1 : 0);
-  });
+  const auto decide = [d](auto sum, std::size_t) {
+    return hn::Add(hn::ShiftRight<15>(sum), hn::Set(d, 1));
+  };
+  permuteSteps(d, decide, work, 0, laneGroups, L, extrinsic, lu);
+  const hn::Rebind<std::uint8_t, decltype(d8)> bytes8;
+  for (std::size_t first = 0; first < S; first += 8) {
+    const std::size_t lanes = std::min<std::size_t>(8, S - first);
+    std::uint8_t* target[8];
+    for (std::size_t s = 0; s < lanes; ++s) {
+      target[s] = blocks[(first + s) / P]->bits + (first + s) % P * L;
+    }
+    const std::int16_t* in = lu + first / N * L * N + first % N;
+    const std::size_t vectorRows = lanes == 8 ? fullRows : 0;
+    for (std::size_t k = 0; k < vectorRows; k += 8) {
+      V8 r[8];
+      for (int t = 0; t < 8; ++t) r[t] = hn::LoadU(d8, in + (k + t) * N);
+      transpose8(d8, r);
+      for (int s = 0; s < 8; ++s) hn::StoreU(hn::DemoteTo(bytes8, r[s]), bytes8, target[s] + k);
+    }
+    for (std::size_t k = vectorRows; k < L; ++k) {
+      for (std::size_t s = 0; s < lanes; ++s) {
+        target[s][k] = static_cast<std::uint8_t>(in[k * N + s]);
+      }
+    }
+  }
 }
 
 void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::size_t count) {
@@ -603,7 +588,7 @@ bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& cor
   const std::size_t n = work.positions;
   bool ok = work.lu.allocate(n) && work.extrinsic.allocate(n) &&
             work.alpha.allocate(7 * groupLanes * L) && work.laneStates.allocate(16 * 32) &&
-            work.pi.allocate(K) && work.piInverse.allocate(K) && work.received.allocate(3 * K * B);
+            work.pi.allocate(K) && work.piInverse.allocate(K);
   for (int decoder = 0; decoder < 2; ++decoder) {
     ok = ok && work.systematic[decoder].allocate(n) && work.parity[decoder].allocate(n) &&
          work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L);

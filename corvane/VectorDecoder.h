@@ -93,7 +93,6 @@ struct VectorWorkspace {
   AlignedArray<std::int16_t> laneStates;  // 2 x 8 x 32 boundary metrics of a lane group
   AlignedArray<std::uint16_t> pi;         // QPP permutation of the group's K
   AlignedArray<std::uint16_t> piInverse;
-  AlignedArray<std::int16_t> received;  // d0, d1, d2 of one block, saturated
   std::size_t tablesK = 0;              // the K of pi, sourceStep and lanePattern
   // [decoder][alpha, beta, new alpha, new beta][segment]
   std::unique_ptr<StateMetrics[]> boundaries;
