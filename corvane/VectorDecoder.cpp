@@ -3,6 +3,7 @@
 #include "VectorDecoder.h"
 
 #include <algorithm>
+#include <type_traits>
 
 #if CORVANE_HAVE_HIGHWAY
 
@@ -30,6 +31,10 @@ struct MaxCombine {
   HWY_INLINE void pair(V a0, V b0, V a1, V b1, V& out0, V& out1) const {
     out0 = hn::Max(a0, b0);
     out1 = hn::Max(a1, b1);
+  }
+  template <class V>
+  HWY_INLINE V one(V a, V b) const {
+    return hn::Max(a, b);
   }
 };
 
@@ -79,6 +84,12 @@ struct LogMapCombine {
     out1 = hn::Add(larger1, hn::BitCast(d, hn::PromoteTo(hn::Rebind<std::uint16_t, decltype(d)>(),
                                                          hn::UpperHalf(halfBytes, correction))));
   }
+  template <class V>
+  HWY_INLINE V one(V a, V b) const {
+    V out, unused;
+    pair(a, b, a, b, out, unused);
+    return out;
+  }
 };
 
 // The backward recursion runs in the forward recursion's form on relabelled states:
@@ -99,6 +110,13 @@ HWY_INLINE void forStates1To7(const F& f) {
   f(5);
   f(6);
   f(7);
+}
+
+// f(0), ..., f(7), the same way.
+template <class F>
+HWY_INLINE void forEight(const F& f) {
+  f(0);
+  forStates1To7(f);
 }
 
 // One step of the forward recursion (forwardStep) on the metrics of states 1..7 in m[1..7]
@@ -234,27 +252,304 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
   }
 }
 
+#if HWY_TARGET <= HWY_AVX2
+// A group of one or two windows fills few lanes of the layout above, so its recursions run
+// with the states across the lanes instead: the eight state metrics of one recursion in the
+// eight lanes of a 128-bit block. A register of B blocks (B = 2 or 4) holds the forward
+// recursions of B/2 windows in its lower half and their backward recursions in its upper
+// half, G = 2S/B registers for S windows. Time t takes every forward recursion from alpha_t
+// to alpha_t+1 and every backward one from beta_L-t to beta_L-1-t, each block through a
+// radix-2 step done by byte shuffles within the block: forward, X[j] = alpha[2(j%4)] and
+// Y[j] = alpha[2(j%4)+1] are the two states that lead to j; backward, X[s] = beta[s>>1] and
+// Y[s] = beta[4+(s>>1)] are the states s leads to with register input 0 and 1. The branch
+// metrics GX and GY come by shuffles from the step's quad [0, Lu, Lp, Lu+Lp] (the metric of
+// (u, p) at index u + 2p), and every block steps to combine(X + GX, Y + GY). Every
+// kNormalisationPeriod times the metric of state 0 is subtracted, through the branch
+// metrics so that the recursion does not wait for it.
+//
+// The first L/2 times store the metrics before their step, forward and backward halves
+// exchanged. From time L/2 on, time t reads back those of time L-1-t: beta_t+1 beside each
+// forward recursion and alpha_L-1-t beside each backward one, the metrics at the other end
+// of the branches of step t (forward half) and step L-1-t (backward half). Added to this
+// time's sums X + GX and Y + GY they make all 16 branch sums alpha + gamma + beta, which
+// three levels of shuffle and combine reduce pairwise in the order of extrinsicStep
+// (combine4 within each group of equal (u, p), then the two parity groups), leaving the
+// u = 1 combination in lane 6 and the u = 0 one in lane 7. Their difference is the
+// extrinsic value plus Lu (the branch metrics count u * Lu); the differences of eight times
+// are shifted into an accumulator and written out as rows, less Lu.
+struct StateLaneTable {
+  // Lanes read: the butterfly operands, the branch metrics (quad entry), the partners of
+  // the three combine levels and of the difference, and state 0.
+  std::uint8_t x[8], y[8], gx[8], gy[8], level1[8], level2[8], level3[8], partner[8], first[8];
+};
+constexpr StateLaneTable kForwardLanes = {
+    {0, 2, 4, 6, 0, 2, 4, 6}, {1, 3, 5, 7, 1, 3, 5, 7}, {0, 1, 2, 3, 3, 2, 1, 0},
+    {3, 2, 1, 0, 0, 1, 2, 3}, {4, 5, 6, 7, 0, 1, 2, 3}, {7, 6, 5, 4, 3, 2, 1, 0},
+    {2, 3, 0, 1, 6, 7, 4, 5}, {1, 0, 3, 2, 5, 4, 7, 6}, {0, 0, 0, 0, 0, 0, 0, 0}};
+constexpr StateLaneTable kBackwardLanes = {
+    {0, 0, 1, 1, 2, 2, 3, 3}, {4, 4, 5, 5, 6, 6, 7, 7}, {0, 3, 1, 2, 2, 1, 3, 0},
+    {3, 0, 2, 1, 1, 2, 0, 3}, {1, 0, 3, 2, 5, 4, 7, 6}, {7, 6, 5, 4, 3, 2, 1, 0},
+    {3, 2, 1, 0, 7, 6, 5, 4}, {1, 0, 3, 2, 5, 4, 7, 6}, {0, 0, 0, 0, 0, 0, 0, 0}};
+
+// The byte indices of one table field for every block of d, forward in the lower half and
+// backward in the upper; quad entries of the window of block b are 4 * (b % (B/2)) lanes on.
+template <class D>
+HWY_INLINE auto stateLaneIndices(D d, const std::uint8_t (StateLaneTable::*field)[8],
+                                 bool quad = false) {
+  const hn::Repartition<std::uint8_t, D> bytes;
+  const std::size_t blocks = hn::Lanes(d) / 8;
+  HWY_ALIGN std::uint8_t index[64];
+  for (std::size_t b = 0; b < blocks; ++b) {
+    const StateLaneTable& table = 2 * b < blocks ? kForwardLanes : kBackwardLanes;
+    const std::size_t offset = quad ? 4 * (b % (blocks / 2)) : 0;
+    for (std::size_t lane = 0; lane < 8; ++lane) {
+      const std::size_t source = offset + (table.*field)[lane];
+      index[16 * b + 2 * lane] = static_cast<std::uint8_t>(2 * source);
+      index[16 * b + 2 * lane + 1] = static_cast<std::uint8_t>(2 * source + 1);
+    }
+  }
+  return hn::BitCast(d, hn::Load(bytes, index));
+}
+
+// f(0), ..., f(G - 1) written out, so that arrays of registers stay in registers.
+template <std::size_t G, class F>
+HWY_INLINE void forRegisters(const F& f) {
+  f(0);
+  if constexpr (G > 1) f(1);
+}
+
+// 16 bytes at p in every block of a vector of d's half.
+template <class DH>
+HWY_INLINE auto loadBlockDup(DH dh, const std::int16_t* p) {
+  if constexpr (hn::MaxLanes(DH()) == 8) {
+    return hn::LoadU(dh, p);
+  } else {
+    return hn::LoadDup128(dh, p);
+  }
+}
+
+// The recursions of S windows of length L in G registers of d. quads + 8k holds the quads
+// of step k of windows 0 and 1; rows takes the stored metrics (L/2 + 1 times); metrics holds
+// the G registers' starting metrics and takes the reached ones (not normalised). Writes the
+// raw extrinsic values into rows of eight lanes (lane s of row k, zero beyond S), less the
+// Lu of lu (the same rows).
+template <std::size_t G, class D, class Combine>
+HWY_NOINLINE void decodeStateLanes(D d, const Combine& combine,
+                                   const std::int16_t* HWY_RESTRICT quads,
+                                   const std::int16_t* HWY_RESTRICT lu, std::size_t L,
+                                   std::size_t S, std::int16_t* HWY_RESTRICT rows,
+                                   std::int16_t* HWY_RESTRICT metrics,
+                                   std::int16_t* HWY_RESTRICT extrinsic) {
+  using V = decltype(hn::Zero(d));
+  const hn::Half<D> dh;
+  const hn::Repartition<std::int32_t, D> d32;
+  constexpr std::size_t kLanes = hn::MaxLanes(D());
+  constexpr std::size_t kWindows = kLanes / 16;  // per register
+  const V x = stateLaneIndices(d, &StateLaneTable::x);
+  const V y = stateLaneIndices(d, &StateLaneTable::y);
+  const V gx = stateLaneIndices(d, &StateLaneTable::gx, true);
+  const V gy = stateLaneIndices(d, &StateLaneTable::gy, true);
+  const V level1 = stateLaneIndices(d, &StateLaneTable::level1);
+  const V level2 = stateLaneIndices(d, &StateLaneTable::level2);
+  const V level3 = stateLaneIndices(d, &StateLaneTable::level3);
+  const V partner = stateLaneIndices(d, &StateLaneTable::partner);
+  const V first = stateLaneIndices(d, &StateLaneTable::first);
+  V m[G], accumulated[G];
+  for (std::size_t g = 0; g < G; ++g) {
+    m[g] = hn::Load(d, metrics + g * kLanes);
+    accumulated[g] = hn::Zero(d);
+  }
+  const auto time = [&](std::size_t t, auto store, auto extrinsicToo) {
+    const bool normalise = t % kNormalisationPeriod == 0;
+    forRegisters<G>([&](std::size_t g) {
+      const std::int16_t* quad = quads + g * kWindows * 4;
+      const V q = hn::Combine(d, loadBlockDup(dh, quad + (L - 1 - t) * 8),
+                              loadBlockDup(dh, quad + t * 8));
+      V branchX = hn::TableLookupBytes(q, gx);
+      V branchY = hn::TableLookupBytes(q, gy);
+      if (normalise) {
+        const V state0 = hn::TableLookupBytes(m[g], first);
+        branchX = hn::Sub(branchX, state0);
+        branchY = hn::Sub(branchY, state0);
+      }
+      if (store) hn::Store(hn::ConcatLowerUpper(d, m[g], m[g]), d, rows + (t * G + g) * kLanes);
+      const V sx = hn::Add(hn::TableLookupBytes(m[g], x), branchX);
+      const V sy = hn::Add(hn::TableLookupBytes(m[g], y), branchY);
+      if (extrinsicToo) {
+        const V other = hn::Load(d, rows + ((L - 1 - t) * G + g) * kLanes);
+        V r = combine.one(hn::Add(sx, other), hn::TableLookupBytes(hn::Add(sy, other), level1));
+        r = combine.one(r, hn::TableLookupBytes(r, level2));
+        r = combine.one(r, hn::TableLookupBytes(r, level3));
+        const V difference = hn::Sub(hn::TableLookupBytes(r, partner), r);
+        accumulated[g] = hn::CombineShiftRightBytes<14>(d, accumulated[g], difference);
+      }
+      m[g] = combine.one(sx, sy);
+    });
+  };
+  // Where the flush below finds the pair of each row: row firstRow + chunk + r of a side
+  // holds time last - 7 + chunk + r (forward) or last - chunk - r (backward), lane i of the
+  // accumulator, which is pair i % 4 of the low (i < 4) or high interleave.
+  constexpr std::size_t kRows = kLanes / 8;  // per vector
+  HWY_ALIGN std::int32_t pairIndex[2][8 / kRows][kLanes / 2] = {};
+  bool pairsHigh[2][8 / kRows];
+  for (int side = 0; side < 2; ++side) {
+    const std::size_t block = side == 0 ? 0 : kWindows;
+    for (std::size_t chunk = 0; chunk < 8; chunk += kRows) {
+      for (std::size_t r = 0; r < kRows; ++r) {
+        const std::size_t i = side == 0 ? 7 - chunk - r : chunk + r;
+        pairIndex[side][chunk / kRows][4 * r] = static_cast<std::int32_t>(4 * block + i % 4);
+        pairsHigh[side][chunk / kRows] = i >= 4;
+      }
+    }
+  }
+  HWY_ALIGN static constexpr std::int32_t kFirstOfRow[16] = {-1, 0, 0, 0, -1, 0, 0, 0,
+                                                             -1, 0, 0, 0, -1, 0, 0, 0};
+  // The rows of eight times ending at time `last`: lane i of each block holds the value of
+  // time last - i. Window pairs become 32-bit lanes (one window: a zero beside it), the
+  // forward ones in block 0, the backward ones in block B/2; then each row takes its pair.
+  const auto flush = [&](std::size_t last) {
+    V low, high;
+    if (S == 1) {
+      low = hn::InterleaveLower(d, accumulated[0], hn::Zero(d));
+      high = hn::InterleaveUpper(d, accumulated[0], hn::Zero(d));
+    } else if (G == 2) {
+      low = hn::InterleaveLower(d, accumulated[0], accumulated[G - 1]);
+      high = hn::InterleaveUpper(d, accumulated[0], accumulated[G - 1]);
+    } else {
+      const V swapped = hn::SwapAdjacentBlocks(accumulated[0]);
+      low = hn::InterleaveLower(d, accumulated[0], swapped);
+      high = hn::InterleaveUpper(d, accumulated[0], swapped);
+    }
+    for (int side = 0; side < 2; ++side) {
+      const std::size_t firstRow = side == 0 ? last - 7 : L - 1 - last;
+      for (std::size_t chunk = 0; chunk < 8; chunk += kRows) {
+        const V source = pairsHigh[side][chunk / kRows] ? high : low;
+        const auto moved = hn::TableLookupLanes(
+            hn::BitCast(d32, source), hn::SetTableIndices(d32, pairIndex[side][chunk / kRows]));
+        const auto row = hn::And(moved, hn::Load(d32, kFirstOfRow));
+        const std::size_t at = (firstRow + chunk) * 8;
+        hn::StoreU(hn::Sub(hn::BitCast(d, row), hn::LoadU(d, lu + at)), d, extrinsic + at);
+      }
+    }
+  };
+  // The last `count` (< 8) times' values, one by one.
+  const auto flushPartly = [&](std::size_t last, std::size_t count) {
+    HWY_ALIGN std::int16_t values[G * kLanes];
+    for (std::size_t g = 0; g < G; ++g) hn::Store(accumulated[g], d, values + g * kLanes);
+    for (std::size_t g = 0; g < G; ++g) {
+      for (std::size_t b = 0; b < 2 * kWindows; ++b) {
+        const std::size_t s = g * kWindows + b % kWindows;
+        for (std::size_t i = 0; i < count; ++i) {
+          const std::size_t row = b < kWindows ? last - i : L - 1 - (last - i);
+          extrinsic[row * 8 + s] =
+              static_cast<std::int16_t>(values[g * kLanes + b * 8 + i] - lu[row * 8 + s]);
+        }
+      }
+    }
+  };
+  const std::true_type yes;
+  const std::false_type no;
+  std::size_t t = 0;
+  for (; t < L / 2; ++t) time(t, yes, no);
+  std::size_t count = 0;
+  if (L % 2 != 0) {  // the middle time stores and reads its own metrics
+    time(t++, yes, yes);
+    count = 1;
+  }
+  for (; t < L; ++t) {
+    time(t, no, yes);
+    if (++count == 8) {
+      flush(t);
+      count = 0;
+    }
+  }
+  if (count != 0) flushPartly(L - 1, count);
+  for (std::size_t g = 0; g < G; ++g) hn::Store(m[g], d, metrics + g * kLanes);
+}
+
+// The quads [0, Lu, Lp, Lu+Lp] of windows 0 and 1 of each row (block) of lus and lps.
+template <class V>
+HWY_INLINE V quadsOf(V lus, V lps) {
+  const hn::DFromV<V> d;
+  const hn::Repartition<std::int32_t, decltype(d)> d32;
+  const auto zeroLu = hn::BitCast(d32, hn::InterleaveLower(d, hn::Zero(d), lus));
+  const auto lpBoth = hn::BitCast(d32, hn::InterleaveLower(d, lps, hn::Add(lus, lps)));
+  return hn::BitCast(d, hn::InterleaveLower(d32, zeroLu, lpBoth));
+}
+
+// quads + 8k = the quads of step k, from rows of eight lanes, as many at a time as d holds.
+template <class D>
+HWY_NOINLINE void buildQuads(D d, const std::int16_t* HWY_RESTRICT lu,
+                             const std::int16_t* HWY_RESTRICT lp, std::size_t L,
+                             std::int16_t* HWY_RESTRICT quads) {
+  const auto rows = [&](auto dv, std::size_t k) {
+    hn::Store(quadsOf(hn::Load(dv, lu + 8 * k), hn::Load(dv, lp + 8 * k)), dv, quads + 8 * k);
+  };
+  std::size_t k = 0;
+  for (; k + hn::Lanes(d) / 8 <= L; k += hn::Lanes(d) / 8) rows(d, k);
+  for (; k < L; ++k) rows(hn::CappedTag<std::int16_t, 8>(), k);
+}
+
+// Decodes S = 1 or 2 windows (segments) with the states across the lanes, in the widest
+// registers their 2S recursions fill, from the quads in work.quads. start and end are the windows' alpha_0 and beta_L;
+// reached takes alpha_L (even entries) and beta_0 (odd entries), normalised.
+template <class Combine>
+HWY_INLINE void decodeWindowsStateLanes(const Combine& combine, VectorWorkspace& work,
+                                        const std::int16_t* lu, const std::int16_t* lp,
+                                        std::size_t L, std::size_t S, const StateMetrics* start,
+                                        const StateMetrics* end, StateMetrics* reached,
+                                        std::int16_t* extrinsic) {
+  const hn::CappedTag<std::int16_t, 32> wide;
+  const hn::CappedTag<std::int16_t, 16> narrow;
+  const std::int16_t* quads = work.quads.get();
+  const std::size_t lanes = S == 2 && hn::Lanes(wide) == 32 ? 32 : 16;
+  const std::size_t windows = lanes / 16;  // per register
+  HWY_ALIGN std::int16_t metrics[2 * 32];
+  const auto metricsOf = [&](std::size_t s) {
+    return metrics + s / windows * lanes + s % windows * 8;
+  };
+  for (std::size_t s = 0; s < S; ++s) {
+    for (int i = 0; i < kStates; ++i) {
+      metricsOf(s)[i] = start[s].m[i];
+      metricsOf(s)[lanes / 2 + i] = end[s].m[i];
+    }
+  }
+  std::int16_t* rows = work.alpha.get();
+  if (lanes == 32) {
+    decodeStateLanes<1>(wide, combine, quads, lu, L, S, rows, metrics, extrinsic);
+  } else if (S == 2) {
+    decodeStateLanes<2>(narrow, combine, quads, lu, L, S, rows, metrics, extrinsic);
+  } else {
+    decodeStateLanes<1>(narrow, combine, quads, lu, L, S, rows, metrics, extrinsic);
+  }
+  for (std::size_t s = 0; s < S; ++s) {
+    const std::int16_t* alpha = metricsOf(s);
+    const std::int16_t* beta = metricsOf(s) + lanes / 2;
+    for (int i = 0; i < kStates; ++i) {
+      reached[2 * s].m[i] = static_cast<Metric>(alpha[i] - alpha[0]);
+      reached[2 * s + 1].m[i] = static_cast<Metric>(beta[i] - beta[0]);
+    }
+  }
+}
+#endif  // HWY_TARGET <= HWY_AVX2
+
 // The a priori value of a raw extrinsic value e: scaled by 0.75 for scaled max-log-MAP,
 // rounded half away from zero as ScaledMaxLogPolicy does, (3|e| + 2) >> 2 = (|e| * 24576 +
 // 16384) >> 15 with e's sign, then saturated to the extrinsic width.
-template <class D>
 struct APriori {
-  using V = decltype(hn::Zero(D()));
-  V limit, negativeLimit, threeQuarters;
+  std::int16_t limit;
   bool scaled;
-  explicit APriori(const VectorWorkspace& work) {
-    const D d;
-    limit = hn::Set(d, static_cast<std::int16_t>(work.extrinsicLimit));
-    negativeLimit = hn::Neg(limit);
-    threeQuarters = hn::Set(d, 24576);
-    scaled = work.algorithm == Algorithm::ScaledMaxLog;
-  }
+  explicit APriori(const VectorWorkspace& work)
+      : limit(static_cast<std::int16_t>(work.extrinsicLimit)),
+        scaled(work.algorithm == Algorithm::ScaledMaxLog) {}
+  template <class V>
   HWY_INLINE V operator()(V e) const {
+    const hn::DFromV<V> d;
     if (scaled) {
-      const V magnitude = hn::MulFixedPoint15(hn::Abs(e), threeQuarters);
+      const V magnitude = hn::MulFixedPoint15(hn::Abs(e), hn::Set(d, 24576));
       e = hn::IfNegativeThenElse(e, hn::Neg(magnitude), magnitude);
     }
-    return hn::Min(hn::Max(e, negativeLimit), limit);
+    return hn::Min(hn::Max(e, hn::Set(d, static_cast<std::int16_t>(-limit))), hn::Set(d, limit));
   }
 };
 
@@ -262,28 +557,47 @@ struct APriori {
 // window comes from step source[k] of the same lane group, its lanes rearranged within each
 // block's windows by pattern[k] (16 byte indices, repeated in every 128-bit block: the P
 // windows of a block share one 128-bit block, P dividing 8). The vector stored at position
-// j (step k) is output(moved, j).
+// j of step k is output(moved, j). Rows of eight lanes go several to a vector.
 template <class D, class Output>
-HWY_NOINLINE void permuteSteps(D d, const Output& output, const VectorWorkspace& work,
+HWY_NOINLINE void permuteSteps(D d, Output output, const VectorWorkspace& work,
                                int toDecoder, std::size_t laneGroups, std::size_t L,
                                const std::int16_t* HWY_RESTRICT from,
                                std::int16_t* HWY_RESTRICT out) {
   const std::size_t N = hn::Lanes(d);
-  const hn::Repartition<std::uint8_t, D> bytes;
   const std::uint16_t* source = work.sourceStep[toDecoder].get();
   const std::uint8_t* pattern = work.lanePattern[toDecoder].get();
   const bool permuted = work.processingUnits > 1;
+  // Steps k..k+rows-1 of the lane group starting at `first`, in one vector of dv.
+  const auto steps = [&](auto dv, std::size_t first, std::size_t k) {
+    const hn::Repartition<std::uint8_t, decltype(dv)> bytes;
+    decltype(hn::Zero(dv)) moved;
+    if constexpr (hn::MaxLanes(decltype(dv)()) == 4 * hn::MaxLanes(D())) {
+      const hn::Half<decltype(dv)> dh;
+      const auto row = [&](std::size_t r) { return hn::Load(d, from + first + source[k + r] * N); };
+      moved = hn::Combine(dv, hn::Combine(dh, row(3), row(2)), hn::Combine(dh, row(1), row(0)));
+    } else if constexpr (hn::MaxLanes(decltype(dv)()) == 2 * hn::MaxLanes(D())) {
+      const auto row = [&](std::size_t r) { return hn::Load(d, from + first + source[k + r] * N); };
+      moved = hn::Combine(dv, row(1), row(0));
+    } else {
+      moved = hn::Load(dv, from + first + source[k] * N);
+    }
+    if (permuted) {
+      const auto indices = N == 8 ? hn::LoadU(bytes, pattern + 16 * k)
+                                  : hn::LoadDup128(bytes, pattern + 16 * k);
+      moved = hn::TableLookupBytes(moved, hn::BitCast(dv, indices));
+    }
+    const std::size_t at = first + k * N;
+    hn::Store(output(moved, at), dv, out + at);
+  };
   for (std::size_t group = 0; group < laneGroups; ++group) {
     const std::size_t first = group * L * N;
-    for (std::size_t k = 0; k < L; ++k) {
-      auto moved = hn::Load(d, from + first + source[k] * N);
-      if (permuted) {
-        moved =
-            hn::TableLookupBytes(moved, hn::BitCast(d, hn::LoadDup128(bytes, pattern + 16 * k)));
-      }
-      const std::size_t at = first + k * N;
-      hn::Store(output(moved, at), d, out + at);
+    std::size_t k = 0;
+    if constexpr (hn::MaxLanes(D()) == 8 && HWY_TARGET <= HWY_AVX2) {
+      const hn::CappedTag<std::int16_t, 32> wide;
+      const std::size_t rows = hn::Lanes(wide) / 8;
+      for (; k + rows <= L; k += rows) steps(wide, first, k);
     }
+    for (; k < L; ++k) steps(d, first, k);
   }
 }
 
@@ -369,6 +683,9 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   const std::size_t positions = laneGroups * L * N;
   const std::uint32_t iterations = blocks[0]->iterations;
   const bool paired = laneGroups == 1 && hn::Lanes(dPaired) == 2 * N;
+  // One or two windows run with the states across the lanes where registers hold at least
+  // two blocks.
+  const bool stateLanes = S <= 2 && HWY_TARGET <= HWY_AVX2;
   // Every second alpha stored when all would take more than 1 MiB.
   const std::size_t stride = 7 * N * L * sizeof(std::int16_t) > (std::size_t{1} << 20) ? 2 : 1;
   if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
@@ -380,7 +697,9 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   // Block b's window w is segment s = b*P + w, in lane s % N of lane group s / N (a lane
   // group holds N / P whole blocks); lanes without a segment hold zeros. Values move between
   // the blocks' arrays and the lanes eight segments by eight steps at a time, transposed in
-  // registers, and the rest one by one.
+  // registers (missing segments read zeros and write to a sink), and the last steps one by
+  // one.
+  if (stateLanes) std::fill_n(extrinsic, positions, std::int16_t{0});
   if (S % N != 0) {
     std::fill_n(sys[0], positions, std::int16_t{0});
     std::fill_n(par[0], positions, std::int16_t{0});
@@ -395,20 +714,19 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     const std::size_t lanes = std::min<std::size_t>(8, S - first);
     for (int stream = 0; stream < 3; ++stream) {
       const std::int32_t* source[8];
-      for (std::size_t s = 0; s < lanes; ++s) {
-        const CodeBlock& block = *blocks[(first + s) / P];
+      for (std::size_t s = 0; s < 8; ++s) {
+        const CodeBlock& block = *blocks[std::min(first + s, S - 1) / P];
         const std::int32_t* streams[3] = {block.d0, block.d1, block.d2};
-        source[s] = streams[stream] + (first + s) % P * L;
+        source[s] = s < lanes ? streams[stream] + (first + s) % P * L : work.zeros.get();
       }
       std::int16_t* out = arrays[stream] + first / N * L * N + first % N;
-      const std::size_t vectorRows = lanes == 8 ? fullRows : 0;
-      for (std::size_t k = 0; k < vectorRows; k += 8) {
+      for (std::size_t k = 0; k < fullRows; k += 8) {
         V8 r[8];
-        for (int s = 0; s < 8; ++s) r[s] = loadSoftValues(d8, source[s] + k);
+        forEight([&](int s) { r[s] = loadSoftValues(d8, source[s] + k); });
         transpose8(d8, r);
-        for (int t = 0; t < 8; ++t) hn::StoreU(r[t], d8, out + (k + t) * N);
+        forEight([&](int t) { hn::StoreU(r[t], d8, out + (k + t) * N); });
       }
-      for (std::size_t k = vectorRows; k < L; ++k) {
+      for (std::size_t k = fullRows; k < L; ++k) {
         for (std::size_t s = 0; s < lanes; ++s) out[k * N + s] = softValue(source[s][k]);
       }
     }
@@ -432,7 +750,23 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     StateMetrics* alphaOut = boundaries + (4 * decoder + 2) * segments;
     StateMetrics* betaOut = boundaries + (4 * decoder + 3) * segments;
     std::int16_t* states = work.laneStates.get();
-    for (std::size_t group = 0; group < laneGroups; ++group) {
+    if (stateLanes) {
+      StateMetrics starts[2], ends[2], reached[4];
+      for (std::size_t s = 0; s < S; ++s) {
+        const std::size_t w = s % P;
+        starts[s] = w == 0 ? start : alphaIn[s];
+        ends[s] = w == P - 1 ? work.tails[2 * (s / P) + decoder] : betaIn[s + 1];
+      }
+#if HWY_TARGET <= HWY_AVX2
+      decodeWindowsStateLanes(combine, work, lu, par[decoder], L, S, starts, ends, reached,
+                              extrinsic);
+#endif
+      for (std::size_t s = 0; s < S; ++s) {
+        alphaOut[s + 1] = reached[2 * s];
+        betaOut[s] = reached[2 * s + 1];
+      }
+    }
+    for (std::size_t group = 0; group < laneGroups && !stateLanes; ++group) {
       for (std::size_t lane = 0; lane < N; ++lane) {
         const std::size_t s = group * N + lane;
         const std::size_t w = s % P;
@@ -469,16 +803,33 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
       }
     }
   };
-  const APriori<D> aPriori(work);
+  const APriori aPriori(work);
   const auto toDecoder = [&](int decoder) {
     const std::int16_t* systematic = sys[decoder];
-    const auto aPrioriPlusSystematic = [&](auto moved, std::size_t at) {
-      return hn::Add(hn::Load(d, systematic + at), aPriori(moved));
+    const auto aPrioriPlusSystematic = [aPriori, systematic](auto moved, std::size_t at) {
+      return hn::Add(hn::Load(hn::DFromV<decltype(moved)>(), systematic + at), aPriori(moved));
     };
+#if HWY_TARGET <= HWY_AVX2
+    if (stateLanes) {  // the quads of the state-lane recursions as well
+      const std::int16_t* lp = par[decoder];
+      std::int16_t* quads = work.quads.get();
+      const auto withQuads = [aPrioriPlusSystematic, lp, quads](auto moved, std::size_t at) {
+        const auto lus = aPrioriPlusSystematic(moved, at);
+        const hn::DFromV<decltype(moved)> dv;
+        hn::Store(quadsOf(lus, hn::Load(dv, lp + at)), dv, quads + at);
+        return lus;
+      };
+      permuteSteps(d, withQuads, work, decoder, laneGroups, L, extrinsic, lu);
+      return;
+    }
+#endif
     permuteSteps(d, aPrioriPlusSystematic, work, decoder, laneGroups, L, extrinsic, lu);
   };
   const auto iterate = [&](const auto& combine) {
     std::copy_n(sys[0], positions, lu);
+#if HWY_TARGET <= HWY_AVX2
+    if (stateLanes) buildQuads(hn::CappedTag<std::int16_t, 32>(), lu, par[0], L, work.quads.get());
+#endif
     for (std::uint32_t iteration = 0; iteration < iterations; ++iteration) {
       halfIteration(combine, 0);
       toDecoder(1);
@@ -496,26 +847,25 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   for (std::size_t j = 0; j < positions; j += N) {
     hn::Store(hn::Add(hn::Load(d, lu + j), hn::Load(d, extrinsic + j)), d, extrinsic + j);
   }
-  const auto decide = [d](auto sum, std::size_t) {
-    return hn::Add(hn::ShiftRight<15>(sum), hn::Set(d, 1));
+  const auto decide = [](auto sum, std::size_t) {
+    return hn::Add(hn::ShiftRight<15>(sum), hn::Set(hn::DFromV<decltype(sum)>(), 1));
   };
   permuteSteps(d, decide, work, 0, laneGroups, L, extrinsic, lu);
   const hn::Rebind<std::uint8_t, decltype(d8)> bytes8;
   for (std::size_t first = 0; first < S; first += 8) {
     const std::size_t lanes = std::min<std::size_t>(8, S - first);
     std::uint8_t* target[8];
-    for (std::size_t s = 0; s < lanes; ++s) {
-      target[s] = blocks[(first + s) / P]->bits + (first + s) % P * L;
+    for (std::size_t s = 0; s < 8; ++s) {
+      target[s] = s < lanes ? blocks[(first + s) / P]->bits + (first + s) % P * L : work.sink.get();
     }
     const std::int16_t* in = lu + first / N * L * N + first % N;
-    const std::size_t vectorRows = lanes == 8 ? fullRows : 0;
-    for (std::size_t k = 0; k < vectorRows; k += 8) {
+    for (std::size_t k = 0; k < fullRows; k += 8) {
       V8 r[8];
-      for (int t = 0; t < 8; ++t) r[t] = hn::LoadU(d8, in + (k + t) * N);
+      forEight([&](int t) { r[t] = hn::LoadU(d8, in + (k + t) * N); });
       transpose8(d8, r);
-      for (int s = 0; s < 8; ++s) hn::StoreU(hn::DemoteTo(bytes8, r[s]), bytes8, target[s] + k);
+      forEight([&](int s) { hn::StoreU(hn::DemoteTo(bytes8, r[s]), bytes8, target[s] + k); });
     }
-    for (std::size_t k = vectorRows; k < L; ++k) {
+    for (std::size_t k = fullRows; k < L; ++k) {
       for (std::size_t s = 0; s < lanes; ++s) {
         target[s][k] = static_cast<std::uint8_t>(in[k * N + s]);
       }
@@ -588,12 +938,14 @@ bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& cor
   const std::size_t n = work.positions;
   bool ok = work.lu.allocate(n) && work.extrinsic.allocate(n) &&
             work.alpha.allocate(7 * groupLanes * L) && work.laneStates.allocate(16 * 32) &&
-            work.pi.allocate(K) && work.piInverse.allocate(K);
+            work.pi.allocate(K) && work.piInverse.allocate(K) && work.quads.allocate(16 * K) &&
+            work.zeros.allocate(K + 8) && work.sink.allocate(K);
   for (int decoder = 0; decoder < 2; ++decoder) {
     ok = ok && work.systematic[decoder].allocate(n) && work.parity[decoder].allocate(n) &&
          work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L);
   }
   if (!ok || !work.oneLane.init(config)) return false;
+  std::fill_n(work.zeros.get(), K + 8, 0);
   work.boundaries.reset(new (std::nothrow) StateMetrics[8 * work.maxSegments]);
   work.tails.reset(new (std::nothrow) StateMetrics[2 * B]);
   itsGroup.reset(new (std::nothrow) const CodeBlock*[B]);
