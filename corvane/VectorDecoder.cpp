@@ -10,6 +10,7 @@
 #undef HWY_TARGET_INCLUDE
 #define HWY_TARGET_INCLUDE "VectorDecoder.cpp"
 #include <hwy/foreach_target.h>  // IWYU pragma: keep
+#include <hwy/cache_control.h>
 #include <hwy/highway.h>
 
 HWY_BEFORE_NAMESPACE();
@@ -139,63 +140,149 @@ HWY_INLINE void trellisStep(const Combine& combine, V (&m)[kStates], V zero, V g
   m[7] = hn::Sub(n7, n0);
 }
 
-// extrinsicStep from alpha_k (a[1..7]) and relabelled beta_k+1 (r[1..7]), alpha_0 = beta_0 = 0.
-template <class D, class Combine, class V>
-HWY_INLINE V extrinsicOf(D d, const Combine& combine, const V (&a)[kStates], const V (&r)[kStates],
-                         V zero, V p) {
+// extrinsicStep from alpha_k (alpha(i) for i = 1..7) and relabelled beta_k+1 (r[1..7]),
+// alpha_0 = beta_0 = 0, one group of equal u after the other (combine4 within each group of
+// equal (u, p), then the two parity groups), so that few values are live at once.
+template <class Combine, class Alpha, class V>
+HWY_INLINE V extrinsicOf(const Combine& combine, const Alpha& alpha, const V (&r)[kStates], V zero,
+                         V p) {
   const V b1 = r[4], b2 = r[2], b3 = r[6], b4 = r[1], b5 = r[5], b6 = r[3], b7 = r[7];
-  // The four groups of equal (u, p), each combined pairwise as combine4 does.
-  V one0a, one0b, one1a, one1b, zero0a, zero0b, zero1a, zero1b;
-  combine.pair(hn::Add(a[2], b1), hn::Add(a[3], b5), hn::Add(a[4], b6), hn::Add(a[5], b2), one0a,
-               one0b);
-  combine.pair(b4, a[1], hn::Add(a[6], b3), hn::Add(a[7], b7), one1a, one1b);
-  combine.pair(zero, hn::Add(a[1], b4), hn::Add(a[6], b7), hn::Add(a[7], b3), zero0a, zero0b);
-  combine.pair(hn::Add(a[2], b5), hn::Add(a[3], b1), hn::Add(a[4], b2), hn::Add(a[5], b6), zero1a,
-               zero1b);
-  V oneParity0, oneParity1, zeroParity0, zeroParity1, one, none;
-  combine.pair(one0a, one0b, one1a, one1b, oneParity0, oneParity1);
-  combine.pair(zero0a, zero0b, zero1a, zero1b, zeroParity0, zeroParity1);
-  combine.pair(oneParity0, hn::Add(oneParity1, p), zeroParity0, hn::Add(zeroParity1, p), one, none);
-  const V e = hn::SaturatedSub(one, none);
-  return hn::Max(e, hn::Set(d, -32767));
+  if constexpr (std::is_same_v<Combine, MaxCombine>) {
+    // Max-log-MAP: the maxima may be taken in any order, so each alpha goes into the
+    // maxima of both its branches while it is loaded (u = 1 groups one0/one1 by parity).
+    V one0 = hn::Max(hn::Add(alpha(2), b1), hn::Add(alpha(3), b5));
+    V zero1 = hn::Max(hn::Add(alpha(2), b5), hn::Add(alpha(3), b1));
+    one0 = hn::Max(one0, hn::Add(alpha(4), b6));
+    zero1 = hn::Max(zero1, hn::Add(alpha(4), b2));
+    one0 = hn::Max(one0, hn::Add(alpha(5), b2));
+    zero1 = hn::Max(zero1, hn::Add(alpha(5), b6));
+    V zero0 = hn::Max(zero, hn::Add(alpha(1), b4));
+    V one1 = hn::Max(b4, alpha(1));
+    zero0 = hn::Max(zero0, hn::Add(alpha(6), b7));
+    one1 = hn::Max(one1, hn::Add(alpha(6), b3));
+    zero0 = hn::Max(zero0, hn::Add(alpha(7), b3));
+    one1 = hn::Max(one1, hn::Add(alpha(7), b7));
+    return hn::Sub(hn::Max(one0, hn::Add(one1, p)), hn::Max(zero0, hn::Add(zero1, p)));
+  }
+  V x, y, z, w, one0, one1, zero0, zero1, one, none;
+  combine.pair(hn::Add(alpha(2), b1), hn::Add(alpha(3), b5), hn::Add(alpha(4), b6),
+               hn::Add(alpha(5), b2), x, y);
+  combine.pair(b4, alpha(1), hn::Add(alpha(6), b3), hn::Add(alpha(7), b7), z, w);
+  combine.pair(x, y, z, w, one0, one1);
+  combine.pair(zero, hn::Add(alpha(1), b4), hn::Add(alpha(6), b7), hn::Add(alpha(7), b3), x, y);
+  combine.pair(hn::Add(alpha(2), b5), hn::Add(alpha(3), b1), hn::Add(alpha(4), b2),
+               hn::Add(alpha(5), b6), z, w);
+  combine.pair(x, y, z, w, zero0, zero1);
+  combine.pair(one0, hn::Add(one1, p), zero0, hn::Add(zero1, p), one, none);
+  return hn::Sub(one, none);  // |e| < 7000 (see VectorDecoder.h)
+}
+
+// The a priori value of a raw extrinsic value e: scaled by 0.75 for scaled max-log-MAP,
+// rounded half away from zero as ScaledMaxLogPolicy does, (3|e| + 2) >> 2 = (|e| * 24576 +
+// 16384) >> 15 with e's sign, then saturated to the extrinsic width.
+struct APriori {
+  std::int16_t limit;
+  bool scaled;
+  explicit APriori(const VectorWorkspace& work)
+      : limit(static_cast<std::int16_t>(work.extrinsicLimit)),
+        scaled(work.algorithm == Algorithm::ScaledMaxLog) {}
+  template <class V>
+  HWY_INLINE V operator()(V e) const {
+    const hn::DFromV<V> d;
+    if (scaled) {
+      const V magnitude = hn::MulFixedPoint15(hn::Abs(e), hn::Set(d, 24576));
+      e = hn::IfNegativeThenElse(e, hn::Neg(magnitude), magnitude);
+    }
+    return hn::Min(hn::Max(e, hn::Set(d, static_cast<std::int16_t>(-limit))), hn::Set(d, limit));
+  }
+};
+
+// Where the values of a decoder's step come from in the other decoder's order: step
+// source[k] of the same lane group (from), its lanes rearranged within each block's windows
+// by pattern[k] (16 byte indices, repeated in every 128-bit block: the P windows of a block
+// share one 128-bit block, P dividing 8; none for P = 1).
+struct StepSource {
+  const std::int16_t* from;
+  const std::uint16_t* source;
+  const std::uint8_t* pattern;
+  bool permuted;
+};
+
+constexpr std::size_t kPrefetchDistance = 16;  // steps
+
+// The values of step k, in a vector of d (one row of the lane group).
+template <class D>
+HWY_INLINE auto movedStep(D d, const StepSource& step, std::size_t k) {
+  const std::size_t N = hn::Lanes(d);
+  auto moved = hn::Load(d, step.from + step.source[k] * N);
+  if (step.permuted) {
+    const hn::Repartition<std::uint8_t, D> bytes;
+    const auto indices = N == 8 ? hn::LoadU(bytes, step.pattern + 16 * k)
+                                : hn::LoadDup128(bytes, step.pattern + 16 * k);
+    moved = hn::TableLookupBytes(moved, hn::BitCast(d, indices));
+  }
+  return moved;
+}
+
+// Starts loading the values of step k (when there is one).
+template <class D>
+HWY_INLINE void prefetchStep(D d, const StepSource& step, std::size_t k, std::size_t length) {
+  if (k < length) hwy::Prefetch(step.from + step.source[k] * hn::Lanes(d));
 }
 
 // One lane group of one half-iteration, lanes = segments: the forward recursion from the
 // alpha metrics in states[0..7] (one row of lanes per state) over `length` steps, storing
-// the alpha of every stride-th step, then the backward recursion from the relabelled beta
+// the alpha of every (2^strideShift)-th step, then the backward recursion from the relabelled beta
 // metrics in states[8..15] with the raw extrinsic value of every step (an alpha not stored
 // is made again from the last stored one). Leaves the reached alpha and (relabelled) beta in
-// states. A stride of 2 halves the store for long windows, which then stays in the cache.
+// states. A stride of 2 halves the store for long windows, which then stays in the cache
+// (shifts, not divisions, index the store).
+// The forward recursion also makes each step's Lu, systematic + the a priori value of the
+// other decoder's raw extrinsic value (the exchange of permuteSteps), and stores it in lu;
+// the backward recursion then overwrites those extrinsic values with its own.
 template <class D, class Combine>
-HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const std::int16_t* HWY_RESTRICT lu,
+HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource& exchange,
+                                  const APriori& aPriori,
+                                  const std::int16_t* HWY_RESTRICT systematic,
+                                  std::int16_t* HWY_RESTRICT lu,
                                   const std::int16_t* HWY_RESTRICT lp, std::size_t length,
-                                  std::size_t stride, std::int16_t* HWY_RESTRICT alphaStore,
+                                  int strideShift, std::int16_t* HWY_RESTRICT alphaStore,
                                   std::int16_t* HWY_RESTRICT states,
                                   std::int16_t* HWY_RESTRICT extrinsic) {
   using V = decltype(hn::Zero(d));
   const std::size_t N = hn::Lanes(d);
+  const std::size_t strideMask = (std::size_t{1} << strideShift) - 1;
   const V zero = hn::Zero(d);
   V a[kStates], r[kStates];
   forStates1To7([&](int m) { a[m] = hn::Load(d, states + m * N); });
   for (std::size_t k = 0; k < length; ++k) {
-    if (k % stride == 0) {
-      std::int16_t* store = alphaStore + k / stride * 7 * N;
+    prefetchStep(d, exchange, k + kPrefetchDistance, length);
+    if ((k & strideMask) == 0) {
+      std::int16_t* store = alphaStore + (k >> strideShift) * 7 * N;
       forStates1To7([&](int m) { hn::Store(a[m], d, store + (m - 1) * N); });
     }
-    trellisStep(combine, a, zero, hn::Load(d, lu + k * N), hn::Load(d, lp + k * N));
+    const V g = hn::Add(hn::Load(d, systematic + k * N), aPriori(movedStep(d, exchange, k)));
+    hn::Store(g, d, lu + k * N);
+    trellisStep(combine, a, zero, g, hn::Load(d, lp + k * N));
   }
   forStates1To7([&](int m) { hn::Store(a[m], d, states + m * N); });
   forStates1To7([&](int m) { r[m] = hn::Load(d, states + (8 + m) * N); });
+  HWY_ALIGN std::int16_t made[7 * 32];  // an alpha not stored, made again
   for (std::size_t k = length; k-- > 0;) {
-    const std::size_t stored = k - k % stride;
-    const std::int16_t* store = alphaStore + stored / stride * 7 * N;
-    forStates1To7([&](int m) { a[m] = hn::Load(d, store + (m - 1) * N); });
-    for (std::size_t t = stored; t < k; ++t) {
-      trellisStep(combine, a, zero, hn::Load(d, lu + t * N), hn::Load(d, lp + t * N));
+    const std::size_t stored = k & ~strideMask;
+    const std::int16_t* alpha = alphaStore + (stored >> strideShift) * 7 * N;
+    if (stored != k) {
+      forStates1To7([&](int m) { a[m] = hn::Load(d, alpha + (m - 1) * N); });
+      for (std::size_t t = stored; t < k; ++t) {
+        trellisStep(combine, a, zero, hn::Load(d, lu + t * N), hn::Load(d, lp + t * N));
+      }
+      forStates1To7([&](int m) { hn::Store(a[m], d, made + (m - 1) * N); });
+      alpha = made;
     }
     const V g = hn::Load(d, lu + k * N);
     const V p = hn::Load(d, lp + k * N);
-    hn::Store(extrinsicOf(d, combine, a, r, zero, p), d, extrinsic + k * N);
+    const auto alphaOf = [&](int m) { return hn::Load(d, alpha + (m - 1) * N); };
+    hn::Store(extrinsicOf(combine, alphaOf, r, zero, p), d, extrinsic + k * N);
     trellisStep(combine, r, zero, p, g);
   }
   forStates1To7([&](int m) { hn::Store(r[m], d, states + (8 + m) * N); });
@@ -246,7 +333,7 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
       r[i] = hn::ConcatUpperUpper(d, fromK, fromK2);
     });
     const V p = hn::Combine(d, hn::Load(dh, lp + k2 * N), hn::Load(dh, lp + k * N));
-    const V e = extrinsicOf(d, combine, a, r, zero, p);
+    const V e = extrinsicOf(combine, [&](int i) { return a[i]; }, r, zero, p);
     hn::Store(hn::UpperHalf(dh, e), dh, extrinsic + k2 * N);
     hn::Store(hn::LowerHalf(dh, e), dh, extrinsic + k * N);
   }
@@ -533,71 +620,45 @@ HWY_INLINE void decodeWindowsStateLanes(const Combine& combine, VectorWorkspace&
 }
 #endif  // HWY_TARGET <= HWY_AVX2
 
-// The a priori value of a raw extrinsic value e: scaled by 0.75 for scaled max-log-MAP,
-// rounded half away from zero as ScaledMaxLogPolicy does, (3|e| + 2) >> 2 = (|e| * 24576 +
-// 16384) >> 15 with e's sign, then saturated to the extrinsic width.
-struct APriori {
-  std::int16_t limit;
-  bool scaled;
-  explicit APriori(const VectorWorkspace& work)
-      : limit(static_cast<std::int16_t>(work.extrinsicLimit)),
-        scaled(work.algorithm == Algorithm::ScaledMaxLog) {}
-  template <class V>
-  HWY_INLINE V operator()(V e) const {
-    const hn::DFromV<V> d;
-    if (scaled) {
-      const V magnitude = hn::MulFixedPoint15(hn::Abs(e), hn::Set(d, 24576));
-      e = hn::IfNegativeThenElse(e, hn::Neg(magnitude), magnitude);
-    }
-    return hn::Min(hn::Max(e, hn::Set(d, static_cast<std::int16_t>(-limit))), hn::Set(d, limit));
-  }
-};
-
-// Carries values of one decoder's order into the other's: the value for step k of every
-// window comes from step source[k] of the same lane group, its lanes rearranged within each
-// block's windows by pattern[k] (16 byte indices, repeated in every 128-bit block: the P
-// windows of a block share one 128-bit block, P dividing 8). The vector stored at position
-// j of step k is output(moved, j). Rows of eight lanes go several to a vector.
+// Carries values of one decoder's order into the other's (see StepSource): the vector
+// stored at position j of step k is output(moved, j). Rows of eight lanes go several to a
+// vector.
 template <class D, class Output>
-HWY_NOINLINE void permuteSteps(D d, Output output, const VectorWorkspace& work,
-                               int toDecoder, std::size_t laneGroups, std::size_t L,
+HWY_NOINLINE void permuteSteps(D d, Output output, const VectorWorkspace& work, int toDecoder,
+                               std::size_t laneGroups, std::size_t L,
                                const std::int16_t* HWY_RESTRICT from,
                                std::int16_t* HWY_RESTRICT out) {
   const std::size_t N = hn::Lanes(d);
-  const std::uint16_t* source = work.sourceStep[toDecoder].get();
-  const std::uint8_t* pattern = work.lanePattern[toDecoder].get();
-  const bool permuted = work.processingUnits > 1;
-  // Steps k..k+rows-1 of the lane group starting at `first`, in one vector of dv.
-  const auto steps = [&](auto dv, std::size_t first, std::size_t k) {
-    const hn::Repartition<std::uint8_t, decltype(dv)> bytes;
-    decltype(hn::Zero(dv)) moved;
-    if constexpr (hn::MaxLanes(decltype(dv)()) == 4 * hn::MaxLanes(D())) {
-      const hn::Half<decltype(dv)> dh;
-      const auto row = [&](std::size_t r) { return hn::Load(d, from + first + source[k + r] * N); };
-      moved = hn::Combine(dv, hn::Combine(dh, row(3), row(2)), hn::Combine(dh, row(1), row(0)));
-    } else if constexpr (hn::MaxLanes(decltype(dv)()) == 2 * hn::MaxLanes(D())) {
-      const auto row = [&](std::size_t r) { return hn::Load(d, from + first + source[k + r] * N); };
-      moved = hn::Combine(dv, row(1), row(0));
-    } else {
-      moved = hn::Load(dv, from + first + source[k] * N);
-    }
-    if (permuted) {
-      const auto indices = N == 8 ? hn::LoadU(bytes, pattern + 16 * k)
-                                  : hn::LoadDup128(bytes, pattern + 16 * k);
-      moved = hn::TableLookupBytes(moved, hn::BitCast(dv, indices));
-    }
-    const std::size_t at = first + k * N;
-    hn::Store(output(moved, at), dv, out + at);
-  };
   for (std::size_t group = 0; group < laneGroups; ++group) {
     const std::size_t first = group * L * N;
+    const StepSource step{from + first, work.sourceStep[toDecoder].get(),
+                          work.lanePattern[toDecoder].get(), work.processingUnits > 1};
     std::size_t k = 0;
-    if constexpr (hn::MaxLanes(D()) == 8 && HWY_TARGET <= HWY_AVX2) {
+#if HWY_TARGET <= HWY_AVX2
+    if constexpr (hn::MaxLanes(D()) == 8) {  // rows k..k+rows-1 in one vector
       const hn::CappedTag<std::int16_t, 32> wide;
+      const hn::Repartition<std::uint8_t, decltype(wide)> bytes;
       const std::size_t rows = hn::Lanes(wide) / 8;
-      for (; k + rows <= L; k += rows) steps(wide, first, k);
+      for (; k + rows <= L; k += rows) {
+        const auto row = [&](std::size_t r) { return hn::Load(d, step.from + step.source[k + r] * 8); };
+        decltype(hn::Zero(wide)) moved;
+        if constexpr (hn::MaxLanes(decltype(wide)()) == 32) {
+          const hn::Half<decltype(wide)> dh;
+          moved = hn::Combine(wide, hn::Combine(dh, row(3), row(2)), hn::Combine(dh, row(1), row(0)));
+        } else {
+          moved = hn::Combine(wide, row(1), row(0));
+        }
+        if (step.permuted) {
+          moved = hn::TableLookupBytes(moved, hn::BitCast(wide, hn::LoadU(bytes, step.pattern + 16 * k)));
+        }
+        hn::Store(output(moved, first + k * 8), wide, out + first + k * 8);
+      }
     }
-    for (; k < L; ++k) steps(d, first, k);
+#endif
+    for (; k < L; ++k) {
+      prefetchStep(d, step, k + kPrefetchDistance, L);
+      hn::Store(output(movedStep(d, step, k), first + k * N), d, out + first + k * N);
+    }
   }
 }
 
@@ -687,7 +748,7 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   // two blocks.
   const bool stateLanes = S <= 2 && HWY_TARGET <= HWY_AVX2;
   // Every second alpha stored when all would take more than 1 MiB.
-  const std::size_t stride = 7 * N * L * sizeof(std::int16_t) > (std::size_t{1} << 20) ? 2 : 1;
+  const int strideShift = 7 * N * L * sizeof(std::int16_t) > (std::size_t{1} << 20) ? 1 : 0;
   if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
 
   std::int16_t* sys[2] = {work.systematic[0].get(), work.systematic[1].get()};
@@ -699,7 +760,11 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   // the blocks' arrays and the lanes eight segments by eight steps at a time, transposed in
   // registers (missing segments read zeros and write to a sink), and the last steps one by
   // one.
-  if (stateLanes) std::fill_n(extrinsic, positions, std::int16_t{0});
+  // A group of full lane groups makes its Lu in the forward recursion (see
+  // decodeLaneGroup), the others in a pass of their own (permuteSteps). The first a priori
+  // values come from zero extrinsic values.
+  const bool exchangeInRecursion = !stateLanes && !paired;
+  if (stateLanes || exchangeInRecursion) std::fill_n(extrinsic, positions, std::int16_t{0});
   if (S % N != 0) {
     std::fill_n(sys[0], positions, std::int16_t{0});
     std::fill_n(par[0], positions, std::int16_t{0});
@@ -744,6 +809,7 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   for (std::size_t i = 0; i < 8 * segments; ++i) boundaries[i] = StateMetrics{};
   const StateMetrics start = knownStateZero();
 
+  const APriori aPriori(work);
   const auto halfIteration = [&](const auto& combine, int decoder) {
     StateMetrics* alphaIn = boundaries + (4 * decoder + 0) * segments;
     StateMetrics* betaIn = boundaries + (4 * decoder + 1) * segments;
@@ -785,8 +851,11 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
         decodeLaneGroupPaired(dPaired, combine, lu, par[decoder], L, work.alpha.get(), states,
                               extrinsic);
       } else {
-        decodeLaneGroup(d, combine, lu + first, par[decoder] + first, L, stride, work.alpha.get(),
-                        states, extrinsic + first);
+        const StepSource exchange{extrinsic + first, work.sourceStep[decoder].get(),
+                                  work.lanePattern[decoder].get(), P > 1};
+        decodeLaneGroup(d, combine, exchange, aPriori, sys[decoder] + first, lu + first,
+                        par[decoder] + first, L, strideShift, work.alpha.get(), states,
+                        extrinsic + first);
       }
       for (std::size_t lane = 0; lane < N && group * N + lane < S; ++lane) {
         const std::size_t s = group * N + lane;
@@ -803,8 +872,8 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
       }
     }
   };
-  const APriori aPriori(work);
   const auto toDecoder = [&](int decoder) {
+    if (exchangeInRecursion) return;
     const std::int16_t* systematic = sys[decoder];
     const auto aPrioriPlusSystematic = [aPriori, systematic](auto moved, std::size_t at) {
       return hn::Add(hn::Load(hn::DFromV<decltype(moved)>(), systematic + at), aPriori(moved));
