@@ -743,7 +743,9 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   const std::size_t L = K / P;
   const std::size_t positions = laneGroups * L * N;
   const std::uint32_t iterations = blocks[0]->iterations;
-  const bool paired = laneGroups == 1 && hn::Lanes(dPaired) == 2 * N;
+  // The paired recursions store both metrics of every step: only while that fits 1 MiB.
+  const bool paired = laneGroups == 1 && hn::Lanes(dPaired) == 2 * N &&
+                      7 * 2 * N * L * sizeof(std::int16_t) <= (std::size_t{1} << 20);
   // One or two windows run with the states across the lanes where registers hold at least
   // two blocks.
   const bool stateLanes = S <= 2 && HWY_TARGET <= HWY_AVX2;
