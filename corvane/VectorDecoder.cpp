@@ -3,6 +3,8 @@
 #include "VectorDecoder.h"
 
 #include <algorithm>
+#include <bit>
+#include <cstring>
 #include <type_traits>
 
 #if CORVANE_HAVE_HIGHWAY
@@ -12,6 +14,15 @@
 #include <hwy/foreach_target.h>  // IWYU pragma: keep
 #include <hwy/cache_control.h>
 #include <hwy/highway.h>
+
+// Lambdas of the inner loops are inlined even where the compiler's size estimate would not.
+#ifndef CORVANE_INLINE_LAMBDA
+#if defined(__GNUC__)
+#define CORVANE_INLINE_LAMBDA __attribute__((always_inline))
+#else
+#define CORVANE_INLINE_LAMBDA
+#endif
+#endif
 
 HWY_BEFORE_NAMESPACE();
 namespace corvane {
@@ -339,286 +350,6 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
   }
 }
 
-#if HWY_TARGET <= HWY_AVX2
-// A group of one or two windows fills few lanes of the layout above, so its recursions run
-// with the states across the lanes instead: the eight state metrics of one recursion in the
-// eight lanes of a 128-bit block. A register of B blocks (B = 2 or 4) holds the forward
-// recursions of B/2 windows in its lower half and their backward recursions in its upper
-// half, G = 2S/B registers for S windows. Time t takes every forward recursion from alpha_t
-// to alpha_t+1 and every backward one from beta_L-t to beta_L-1-t, each block through a
-// radix-2 step done by byte shuffles within the block: forward, X[j] = alpha[2(j%4)] and
-// Y[j] = alpha[2(j%4)+1] are the two states that lead to j; backward, X[s] = beta[s>>1] and
-// Y[s] = beta[4+(s>>1)] are the states s leads to with register input 0 and 1. The branch
-// metrics GX and GY come by shuffles from the step's quad [0, Lu, Lp, Lu+Lp] (the metric of
-// (u, p) at index u + 2p), and every block steps to combine(X + GX, Y + GY). Every
-// kNormalisationPeriod times the metric of state 0 is subtracted, through the branch
-// metrics so that the recursion does not wait for it.
-//
-// The first L/2 times store the metrics before their step, forward and backward halves
-// exchanged. From time L/2 on, time t reads back those of time L-1-t: beta_t+1 beside each
-// forward recursion and alpha_L-1-t beside each backward one, the metrics at the other end
-// of the branches of step t (forward half) and step L-1-t (backward half). Added to this
-// time's sums X + GX and Y + GY they make all 16 branch sums alpha + gamma + beta, which
-// three levels of shuffle and combine reduce pairwise in the order of extrinsicStep
-// (combine4 within each group of equal (u, p), then the two parity groups), leaving the
-// u = 1 combination in lane 6 and the u = 0 one in lane 7. Their difference is the
-// extrinsic value plus Lu (the branch metrics count u * Lu); the differences of eight times
-// are shifted into an accumulator and written out as rows, less Lu.
-struct StateLaneTable {
-  // Lanes read: the butterfly operands, the branch metrics (quad entry), the partners of
-  // the three combine levels and of the difference, and state 0.
-  std::uint8_t x[8], y[8], gx[8], gy[8], level1[8], level2[8], level3[8], partner[8], first[8];
-};
-constexpr StateLaneTable kForwardLanes = {
-    {0, 2, 4, 6, 0, 2, 4, 6}, {1, 3, 5, 7, 1, 3, 5, 7}, {0, 1, 2, 3, 3, 2, 1, 0},
-    {3, 2, 1, 0, 0, 1, 2, 3}, {4, 5, 6, 7, 0, 1, 2, 3}, {7, 6, 5, 4, 3, 2, 1, 0},
-    {2, 3, 0, 1, 6, 7, 4, 5}, {1, 0, 3, 2, 5, 4, 7, 6}, {0, 0, 0, 0, 0, 0, 0, 0}};
-constexpr StateLaneTable kBackwardLanes = {
-    {0, 0, 1, 1, 2, 2, 3, 3}, {4, 4, 5, 5, 6, 6, 7, 7}, {0, 3, 1, 2, 2, 1, 3, 0},
-    {3, 0, 2, 1, 1, 2, 0, 3}, {1, 0, 3, 2, 5, 4, 7, 6}, {7, 6, 5, 4, 3, 2, 1, 0},
-    {3, 2, 1, 0, 7, 6, 5, 4}, {1, 0, 3, 2, 5, 4, 7, 6}, {0, 0, 0, 0, 0, 0, 0, 0}};
-
-// The byte indices of one table field for every block of d, forward in the lower half and
-// backward in the upper; quad entries of the window of block b are 4 * (b % (B/2)) lanes on.
-template <class D>
-HWY_INLINE auto stateLaneIndices(D d, const std::uint8_t (StateLaneTable::*field)[8],
-                                 bool quad = false) {
-  const hn::Repartition<std::uint8_t, D> bytes;
-  const std::size_t blocks = hn::Lanes(d) / 8;
-  HWY_ALIGN std::uint8_t index[64];
-  for (std::size_t b = 0; b < blocks; ++b) {
-    const StateLaneTable& table = 2 * b < blocks ? kForwardLanes : kBackwardLanes;
-    const std::size_t offset = quad ? 4 * (b % (blocks / 2)) : 0;
-    for (std::size_t lane = 0; lane < 8; ++lane) {
-      const std::size_t source = offset + (table.*field)[lane];
-      index[16 * b + 2 * lane] = static_cast<std::uint8_t>(2 * source);
-      index[16 * b + 2 * lane + 1] = static_cast<std::uint8_t>(2 * source + 1);
-    }
-  }
-  return hn::BitCast(d, hn::Load(bytes, index));
-}
-
-// f(0), ..., f(G - 1) written out, so that arrays of registers stay in registers.
-template <std::size_t G, class F>
-HWY_INLINE void forRegisters(const F& f) {
-  f(0);
-  if constexpr (G > 1) f(1);
-}
-
-// 16 bytes at p in every block of a vector of d's half.
-template <class DH>
-HWY_INLINE auto loadBlockDup(DH dh, const std::int16_t* p) {
-  if constexpr (hn::MaxLanes(DH()) == 8) {
-    return hn::LoadU(dh, p);
-  } else {
-    return hn::LoadDup128(dh, p);
-  }
-}
-
-// The recursions of S windows of length L in G registers of d. quads + 8k holds the quads
-// of step k of windows 0 and 1; rows takes the stored metrics (L/2 + 1 times); metrics holds
-// the G registers' starting metrics and takes the reached ones (not normalised). Writes the
-// raw extrinsic values into rows of eight lanes (lane s of row k, zero beyond S), less the
-// Lu of lu (the same rows).
-template <std::size_t G, class D, class Combine>
-HWY_NOINLINE void decodeStateLanes(D d, const Combine& combine,
-                                   const std::int16_t* HWY_RESTRICT quads,
-                                   const std::int16_t* HWY_RESTRICT lu, std::size_t L,
-                                   std::size_t S, std::int16_t* HWY_RESTRICT rows,
-                                   std::int16_t* HWY_RESTRICT metrics,
-                                   std::int16_t* HWY_RESTRICT extrinsic) {
-  using V = decltype(hn::Zero(d));
-  const hn::Half<D> dh;
-  const hn::Repartition<std::int32_t, D> d32;
-  constexpr std::size_t kLanes = hn::MaxLanes(D());
-  constexpr std::size_t kWindows = kLanes / 16;  // per register
-  const V x = stateLaneIndices(d, &StateLaneTable::x);
-  const V y = stateLaneIndices(d, &StateLaneTable::y);
-  const V gx = stateLaneIndices(d, &StateLaneTable::gx, true);
-  const V gy = stateLaneIndices(d, &StateLaneTable::gy, true);
-  const V level1 = stateLaneIndices(d, &StateLaneTable::level1);
-  const V level2 = stateLaneIndices(d, &StateLaneTable::level2);
-  const V level3 = stateLaneIndices(d, &StateLaneTable::level3);
-  const V partner = stateLaneIndices(d, &StateLaneTable::partner);
-  const V first = stateLaneIndices(d, &StateLaneTable::first);
-  V m[G], accumulated[G];
-  for (std::size_t g = 0; g < G; ++g) {
-    m[g] = hn::Load(d, metrics + g * kLanes);
-    accumulated[g] = hn::Zero(d);
-  }
-  const auto time = [&](std::size_t t, auto store, auto extrinsicToo) {
-    const bool normalise = t % kNormalisationPeriod == 0;
-    forRegisters<G>([&](std::size_t g) {
-      const std::int16_t* quad = quads + g * kWindows * 4;
-      const V q = hn::Combine(d, loadBlockDup(dh, quad + (L - 1 - t) * 8),
-                              loadBlockDup(dh, quad + t * 8));
-      V branchX = hn::TableLookupBytes(q, gx);
-      V branchY = hn::TableLookupBytes(q, gy);
-      if (normalise) {
-        const V state0 = hn::TableLookupBytes(m[g], first);
-        branchX = hn::Sub(branchX, state0);
-        branchY = hn::Sub(branchY, state0);
-      }
-      if (store) hn::Store(hn::ConcatLowerUpper(d, m[g], m[g]), d, rows + (t * G + g) * kLanes);
-      const V sx = hn::Add(hn::TableLookupBytes(m[g], x), branchX);
-      const V sy = hn::Add(hn::TableLookupBytes(m[g], y), branchY);
-      if (extrinsicToo) {
-        const V other = hn::Load(d, rows + ((L - 1 - t) * G + g) * kLanes);
-        V r = combine.one(hn::Add(sx, other), hn::TableLookupBytes(hn::Add(sy, other), level1));
-        r = combine.one(r, hn::TableLookupBytes(r, level2));
-        r = combine.one(r, hn::TableLookupBytes(r, level3));
-        const V difference = hn::Sub(hn::TableLookupBytes(r, partner), r);
-        accumulated[g] = hn::CombineShiftRightBytes<14>(d, accumulated[g], difference);
-      }
-      m[g] = combine.one(sx, sy);
-    });
-  };
-  // Where the flush below finds the pair of each row: row firstRow + chunk + r of a side
-  // holds time last - 7 + chunk + r (forward) or last - chunk - r (backward), lane i of the
-  // accumulator, which is pair i % 4 of the low (i < 4) or high interleave.
-  constexpr std::size_t kRows = kLanes / 8;  // per vector
-  HWY_ALIGN std::int32_t pairIndex[2][8 / kRows][kLanes / 2] = {};
-  bool pairsHigh[2][8 / kRows];
-  for (int side = 0; side < 2; ++side) {
-    const std::size_t block = side == 0 ? 0 : kWindows;
-    for (std::size_t chunk = 0; chunk < 8; chunk += kRows) {
-      for (std::size_t r = 0; r < kRows; ++r) {
-        const std::size_t i = side == 0 ? 7 - chunk - r : chunk + r;
-        pairIndex[side][chunk / kRows][4 * r] = static_cast<std::int32_t>(4 * block + i % 4);
-        pairsHigh[side][chunk / kRows] = i >= 4;
-      }
-    }
-  }
-  HWY_ALIGN static constexpr std::int32_t kFirstOfRow[16] = {-1, 0, 0, 0, -1, 0, 0, 0,
-                                                             -1, 0, 0, 0, -1, 0, 0, 0};
-  // The rows of eight times ending at time `last`: lane i of each block holds the value of
-  // time last - i. Window pairs become 32-bit lanes (one window: a zero beside it), the
-  // forward ones in block 0, the backward ones in block B/2; then each row takes its pair.
-  const auto flush = [&](std::size_t last) {
-    V low, high;
-    if (S == 1) {
-      low = hn::InterleaveLower(d, accumulated[0], hn::Zero(d));
-      high = hn::InterleaveUpper(d, accumulated[0], hn::Zero(d));
-    } else if (G == 2) {
-      low = hn::InterleaveLower(d, accumulated[0], accumulated[G - 1]);
-      high = hn::InterleaveUpper(d, accumulated[0], accumulated[G - 1]);
-    } else {
-      const V swapped = hn::SwapAdjacentBlocks(accumulated[0]);
-      low = hn::InterleaveLower(d, accumulated[0], swapped);
-      high = hn::InterleaveUpper(d, accumulated[0], swapped);
-    }
-    for (int side = 0; side < 2; ++side) {
-      const std::size_t firstRow = side == 0 ? last - 7 : L - 1 - last;
-      for (std::size_t chunk = 0; chunk < 8; chunk += kRows) {
-        const V source = pairsHigh[side][chunk / kRows] ? high : low;
-        const auto moved = hn::TableLookupLanes(
-            hn::BitCast(d32, source), hn::SetTableIndices(d32, pairIndex[side][chunk / kRows]));
-        const auto row = hn::And(moved, hn::Load(d32, kFirstOfRow));
-        const std::size_t at = (firstRow + chunk) * 8;
-        hn::StoreU(hn::Sub(hn::BitCast(d, row), hn::LoadU(d, lu + at)), d, extrinsic + at);
-      }
-    }
-  };
-  // The last `count` (< 8) times' values, one by one.
-  const auto flushPartly = [&](std::size_t last, std::size_t count) {
-    HWY_ALIGN std::int16_t values[G * kLanes];
-    for (std::size_t g = 0; g < G; ++g) hn::Store(accumulated[g], d, values + g * kLanes);
-    for (std::size_t g = 0; g < G; ++g) {
-      for (std::size_t b = 0; b < 2 * kWindows; ++b) {
-        const std::size_t s = g * kWindows + b % kWindows;
-        for (std::size_t i = 0; i < count; ++i) {
-          const std::size_t row = b < kWindows ? last - i : L - 1 - (last - i);
-          extrinsic[row * 8 + s] =
-              static_cast<std::int16_t>(values[g * kLanes + b * 8 + i] - lu[row * 8 + s]);
-        }
-      }
-    }
-  };
-  const std::true_type yes;
-  const std::false_type no;
-  std::size_t t = 0;
-  for (; t < L / 2; ++t) time(t, yes, no);
-  std::size_t count = 0;
-  if (L % 2 != 0) {  // the middle time stores and reads its own metrics
-    time(t++, yes, yes);
-    count = 1;
-  }
-  for (; t < L; ++t) {
-    time(t, no, yes);
-    if (++count == 8) {
-      flush(t);
-      count = 0;
-    }
-  }
-  if (count != 0) flushPartly(L - 1, count);
-  for (std::size_t g = 0; g < G; ++g) hn::Store(m[g], d, metrics + g * kLanes);
-}
-
-// The quads [0, Lu, Lp, Lu+Lp] of windows 0 and 1 of each row (block) of lus and lps.
-template <class V>
-HWY_INLINE V quadsOf(V lus, V lps) {
-  const hn::DFromV<V> d;
-  const hn::Repartition<std::int32_t, decltype(d)> d32;
-  const auto zeroLu = hn::BitCast(d32, hn::InterleaveLower(d, hn::Zero(d), lus));
-  const auto lpBoth = hn::BitCast(d32, hn::InterleaveLower(d, lps, hn::Add(lus, lps)));
-  return hn::BitCast(d, hn::InterleaveLower(d32, zeroLu, lpBoth));
-}
-
-// quads + 8k = the quads of step k, from rows of eight lanes, as many at a time as d holds.
-template <class D>
-HWY_NOINLINE void buildQuads(D d, const std::int16_t* HWY_RESTRICT lu,
-                             const std::int16_t* HWY_RESTRICT lp, std::size_t L,
-                             std::int16_t* HWY_RESTRICT quads) {
-  const auto rows = [&](auto dv, std::size_t k) {
-    hn::Store(quadsOf(hn::Load(dv, lu + 8 * k), hn::Load(dv, lp + 8 * k)), dv, quads + 8 * k);
-  };
-  std::size_t k = 0;
-  for (; k + hn::Lanes(d) / 8 <= L; k += hn::Lanes(d) / 8) rows(d, k);
-  for (; k < L; ++k) rows(hn::CappedTag<std::int16_t, 8>(), k);
-}
-
-// Decodes S = 1 or 2 windows (segments) with the states across the lanes, in the widest
-// registers their 2S recursions fill, from the quads in work.quads. start and end are the windows' alpha_0 and beta_L;
-// reached takes alpha_L (even entries) and beta_0 (odd entries), normalised.
-template <class Combine>
-HWY_INLINE void decodeWindowsStateLanes(const Combine& combine, VectorWorkspace& work,
-                                        const std::int16_t* lu, const std::int16_t* lp,
-                                        std::size_t L, std::size_t S, const StateMetrics* start,
-                                        const StateMetrics* end, StateMetrics* reached,
-                                        std::int16_t* extrinsic) {
-  const hn::CappedTag<std::int16_t, 32> wide;
-  const hn::CappedTag<std::int16_t, 16> narrow;
-  const std::int16_t* quads = work.quads.get();
-  const std::size_t lanes = S == 2 && hn::Lanes(wide) == 32 ? 32 : 16;
-  const std::size_t windows = lanes / 16;  // per register
-  HWY_ALIGN std::int16_t metrics[2 * 32];
-  const auto metricsOf = [&](std::size_t s) {
-    return metrics + s / windows * lanes + s % windows * 8;
-  };
-  for (std::size_t s = 0; s < S; ++s) {
-    for (int i = 0; i < kStates; ++i) {
-      metricsOf(s)[i] = start[s].m[i];
-      metricsOf(s)[lanes / 2 + i] = end[s].m[i];
-    }
-  }
-  std::int16_t* rows = work.alpha.get();
-  if (lanes == 32) {
-    decodeStateLanes<1>(wide, combine, quads, lu, L, S, rows, metrics, extrinsic);
-  } else if (S == 2) {
-    decodeStateLanes<2>(narrow, combine, quads, lu, L, S, rows, metrics, extrinsic);
-  } else {
-    decodeStateLanes<1>(narrow, combine, quads, lu, L, S, rows, metrics, extrinsic);
-  }
-  for (std::size_t s = 0; s < S; ++s) {
-    const std::int16_t* alpha = metricsOf(s);
-    const std::int16_t* beta = metricsOf(s) + lanes / 2;
-    for (int i = 0; i < kStates; ++i) {
-      reached[2 * s].m[i] = static_cast<Metric>(alpha[i] - alpha[0]);
-      reached[2 * s + 1].m[i] = static_cast<Metric>(beta[i] - beta[0]);
-    }
-  }
-}
-#endif  // HWY_TARGET <= HWY_AVX2
 
 // Carries values of one decoder's order into the other's (see StepSource): the vector
 // stored at position j of step k is output(moved, j). Rows of eight lanes go several to a
@@ -725,10 +456,446 @@ void buildStepTables(VectorWorkspace& work, const QppRow& row) {
         pattern[2 * lane] = static_cast<std::uint8_t>(2 * source);
         pattern[2 * lane + 1] = static_cast<std::uint8_t>(2 * source + 1);
       }
+      // Rows of two lanes (two windows): rotated by 16 bits when lane 0 reads lane 1.
+      work.laneSwap[decoder].get()[k] = static_cast<std::uint8_t>(P == 2 ? 8 * pattern[0] : 0);
     }
   }
   work.tablesK = K;
 }
+
+// The boundary metrics of a group's segments: [decoder][alpha, beta, new alpha, new beta]
+// [segment], entry s of alpha holding segment s's alpha_0 and of beta segment s-1's beta_L,
+// as the previous iteration reached them.
+struct GroupBoundaries {
+  StateMetrics* all;
+  std::size_t segments;  // entries per array
+  std::size_t S, P;
+  const StateMetrics* tails;  // [block][decoder]
+  StateMetrics start = knownStateZero();
+  StateMetrics* array(int decoder, int which) const {
+    return all + (4 * decoder + which) * segments;
+  }
+  const StateMetrics& alphaStart(int decoder, std::size_t s) const {
+    return s % P == 0 ? start : array(decoder, 0)[s];
+  }
+  const StateMetrics& betaEnd(int decoder, std::size_t s) const {
+    return s % P == P - 1 ? tails[2 * (s / P) + decoder] : array(decoder, 1)[s + 1];
+  }
+  void reached(int decoder, std::size_t s, const StateMetrics& alphaEnd,
+               const StateMetrics& betaStart) const {
+    array(decoder, 2)[s + 1] = alphaEnd;
+    array(decoder, 3)[s] = betaStart;
+  }
+  // After a half-iteration: the reached metrics become those the next one starts from.
+  void keep(int decoder) const {
+    for (std::size_t s = 0; s < S; ++s) {
+      if (s % P != 0) {
+        array(decoder, 0)[s] = array(decoder, 2)[s];
+        array(decoder, 1)[s] = array(decoder, 3)[s];
+      }
+    }
+  }
+};
+
+// The tail metrics of every block of a group and boundaries that start equiprobable.
+inline GroupBoundaries startBoundaries(VectorWorkspace& work, const CodeBlock* const* blocks,
+                                       std::size_t count) {
+  for (std::size_t b = 0; b < count; ++b) {
+    StateMetrics betas[2];
+    tailBetas(*blocks[b], betas);
+    work.tails[2 * b] = betas[0];
+    work.tails[2 * b + 1] = betas[1];
+  }
+  const GroupBoundaries ends{work.boundaries.get(), work.maxSegments, count * work.processingUnits,
+                             work.processingUnits, work.tails.get()};
+  std::fill_n(ends.all, 8 * ends.segments, StateMetrics{});
+  return ends;
+}
+
+#if HWY_TARGET <= HWY_AVX2
+// A group of one or two windows (S segments) fills few lanes of the layout above, so its
+// recursions run with the states across the lanes instead: the eight state metrics of one
+// recursion in the eight lanes of a 128-bit block. A register of B blocks (B = 2 or 4)
+// holds the forward recursions of B/2 windows in its lower half and their backward
+// recursions in its upper half, G = 2S/B registers for S windows. Time t takes every
+// forward recursion from alpha_t to alpha_t+1 and every backward one from beta_L-t to
+// beta_L-1-t, each block through a radix-2 step done by byte shuffles within the block:
+// forward, X[j] = alpha[2(j%4)] and Y[j] = alpha[2(j%4)+1] are the two states that lead to
+// j; backward, X[s] = beta[s>>1] and Y[s] = beta[4+(s>>1)] are the states s leads to with
+// register input 0 and 1. The branch metrics GX and GY come by shuffles from the step's
+// quad [0, Lu, Lp, Lu+Lp] (the metric of (u, p) at index u + 2p), and every block steps to
+// combine(X + GX, Y + GY). Every kNormalisationPeriod times the metric of state 0 is
+// subtracted, through the branch metrics so that the recursion does not wait for it.
+//
+// The first L/2 times store the metrics before their step, forward and backward halves
+// exchanged. From time L/2 on, time t reads back those of time L-1-t: beta_t+1 beside each
+// forward recursion and alpha_L-1-t beside each backward one, the metrics at the other end
+// of the branches of step t (forward half) and step L-1-t (backward half). Added to this
+// time's sums X + GX and Y + GY they make all 16 branch sums alpha + gamma + beta, which
+// three levels of shuffle and combine reduce pairwise in the order of extrinsicStep
+// (combine4 within each group of equal (u, p), then the two parity groups), leaving the
+// u = 1 combination in lane 6 and the u = 0 one in lane 7. Their difference is the
+// extrinsic value plus Lu (the branch metrics count u * Lu); the differences of eight times
+// are shifted into an accumulator and written out less Lu.
+//
+// Such a group keeps its values in rows of S lanes (step k of segment s at k*S + s), the
+// quads in rows of 4*S lanes.
+struct StateLaneTable {
+  // Lanes read: the butterfly operands, the branch metrics (quad entry), the partners of
+  // the three combine levels and of the difference, and state 0.
+  std::uint8_t x[8], y[8], gx[8], gy[8], level1[8], level2[8], level3[8], partner[8], first[8];
+};
+constexpr StateLaneTable kForwardLanes = {
+    {0, 2, 4, 6, 0, 2, 4, 6}, {1, 3, 5, 7, 1, 3, 5, 7}, {0, 1, 2, 3, 3, 2, 1, 0},
+    {3, 2, 1, 0, 0, 1, 2, 3}, {4, 5, 6, 7, 0, 1, 2, 3}, {7, 6, 5, 4, 3, 2, 1, 0},
+    {2, 3, 0, 1, 6, 7, 4, 5}, {1, 0, 3, 2, 5, 4, 7, 6}, {0, 0, 0, 0, 0, 0, 0, 0}};
+constexpr StateLaneTable kBackwardLanes = {
+    {0, 0, 1, 1, 2, 2, 3, 3}, {4, 4, 5, 5, 6, 6, 7, 7}, {0, 3, 1, 2, 2, 1, 3, 0},
+    {3, 0, 2, 1, 1, 2, 0, 3}, {1, 0, 3, 2, 5, 4, 7, 6}, {7, 6, 5, 4, 3, 2, 1, 0},
+    {3, 2, 1, 0, 7, 6, 5, 4}, {1, 0, 3, 2, 5, 4, 7, 6}, {0, 0, 0, 0, 0, 0, 0, 0}};
+
+// The byte indices of one table field for every block of d, forward in the lower half and
+// backward in the upper; the quad entries of the window of block b, for a register whose
+// first window is `window`, are 4 * (window + b % (B/2)) lanes on.
+template <class D>
+HWY_INLINE auto stateLaneIndices(D d, const std::uint8_t (StateLaneTable::*field)[8],
+                                 std::size_t window = 0, bool quad = false) {
+  const hn::Repartition<std::uint8_t, D> bytes;
+  const std::size_t blocks = hn::Lanes(d) / 8;
+  HWY_ALIGN std::uint8_t index[64];
+  for (std::size_t b = 0; b < blocks; ++b) {
+    const StateLaneTable& table = 2 * b < blocks ? kForwardLanes : kBackwardLanes;
+    const std::size_t offset = quad ? 4 * (window + b % (blocks / 2)) : 0;
+    for (std::size_t lane = 0; lane < 8; ++lane) {
+      const std::size_t source = offset + (table.*field)[lane];
+      index[16 * b + 2 * lane] = static_cast<std::uint8_t>(2 * source);
+      index[16 * b + 2 * lane + 1] = static_cast<std::uint8_t>(2 * source + 1);
+    }
+  }
+  return hn::BitCast(d, hn::Load(bytes, index));
+}
+
+// f(0), ..., f(G - 1) written out, so that arrays of registers stay in registers.
+template <std::size_t G, class F>
+HWY_INLINE void forRegisters(const F& f) {
+  f(0);
+  if constexpr (G > 1) f(1);
+}
+
+// 16 bytes at p in every block of a vector of d's half.
+template <class DH>
+HWY_INLINE auto loadBlockDup(DH dh, const std::int16_t* p) {
+  if constexpr (hn::MaxLanes(DH()) == 8) {
+    return hn::LoadU(dh, p);
+  } else {
+    return hn::LoadDup128(dh, p);
+  }
+}
+
+// The recursions of S windows of length L in G registers of d, from the quads of every step;
+// rows takes the stored metrics (L/2 + 1 times); metrics holds the G registers' starting
+// metrics and takes the reached ones (not normalised). Writes the raw extrinsic values, less
+// the Lu of lu.
+template <std::size_t G, class D, class Combine>
+HWY_NOINLINE void decodeStateLanes(D d, const Combine& combine,
+                                   const std::int16_t* HWY_RESTRICT quads,
+                                   const std::int16_t* HWY_RESTRICT lu, std::size_t L,
+                                   std::size_t S, std::int16_t* HWY_RESTRICT rows,
+                                   std::int16_t* HWY_RESTRICT metrics,
+                                   std::int16_t* HWY_RESTRICT extrinsic) {
+  using V = decltype(hn::Zero(d));
+  const hn::Half<D> dh;
+  const hn::CappedTag<std::int16_t, 8> d8;
+  constexpr std::size_t kLanes = hn::MaxLanes(D());
+  constexpr std::size_t kWindows = kLanes / 16;  // per register
+  const V x = stateLaneIndices(d, &StateLaneTable::x);
+  const V y = stateLaneIndices(d, &StateLaneTable::y);
+  const V level1 = stateLaneIndices(d, &StateLaneTable::level1);
+  const V level2 = stateLaneIndices(d, &StateLaneTable::level2);
+  const V level3 = stateLaneIndices(d, &StateLaneTable::level3);
+  const V partner = stateLaneIndices(d, &StateLaneTable::partner);
+  const V first = stateLaneIndices(d, &StateLaneTable::first);
+  V gx[G], gy[G], m[G], accumulated[G];
+  for (std::size_t g = 0; g < G; ++g) {
+    gx[g] = stateLaneIndices(d, &StateLaneTable::gx, g * kWindows, true);
+    gy[g] = stateLaneIndices(d, &StateLaneTable::gy, g * kWindows, true);
+    m[g] = hn::Load(d, metrics + g * kLanes);
+    accumulated[g] = hn::Zero(d);
+  }
+  const auto time = [&](std::size_t t, auto store, auto extrinsicToo) CORVANE_INLINE_LAMBDA {
+    // The quads of step t in every forward block, of step L-1-t in every backward one.
+    const V q = hn::Combine(d, loadBlockDup(dh, quads + (L - 1 - t) * 4 * S),
+                            loadBlockDup(dh, quads + t * 4 * S));
+    const bool normalise = t % kNormalisationPeriod == 0;
+    forRegisters<G>([&](std::size_t g) {
+      V branchX = hn::TableLookupBytes(q, gx[g]);
+      V branchY = hn::TableLookupBytes(q, gy[g]);
+      if (normalise) {
+        const V state0 = hn::TableLookupBytes(m[g], first);
+        branchX = hn::Sub(branchX, state0);
+        branchY = hn::Sub(branchY, state0);
+      }
+      if (store) hn::Store(hn::ConcatLowerUpper(d, m[g], m[g]), d, rows + (t * G + g) * kLanes);
+      const V sx = hn::Add(hn::TableLookupBytes(m[g], x), branchX);
+      const V sy = hn::Add(hn::TableLookupBytes(m[g], y), branchY);
+      if (extrinsicToo) {
+        const V other = hn::Load(d, rows + ((L - 1 - t) * G + g) * kLanes);
+        V r = combine.one(hn::Add(sx, other), hn::TableLookupBytes(hn::Add(sy, other), level1));
+        r = combine.one(r, hn::TableLookupBytes(r, level2));
+        r = combine.one(r, hn::TableLookupBytes(r, level3));
+        const V difference = hn::Sub(hn::TableLookupBytes(r, partner), r);
+        accumulated[g] = hn::CombineShiftRightBytes<14>(d, accumulated[g], difference);
+      }
+      m[g] = combine.one(sx, sy);
+    });
+  };
+  // The values of the last `count` times (time `last` in lane 0 of each block): the
+  // forward blocks hold steps last, last-1, ..., the backward blocks L-1-last, L-last, ....
+  HWY_ALIGN std::int16_t values[G * kLanes];
+  const auto blockOf = [&](bool forward, std::size_t s) {
+    return values + s / kWindows * kLanes + ((forward ? 0 : kWindows) + s % kWindows) * 8;
+  };
+  const auto flush = [&](std::size_t last) CORVANE_INLINE_LAMBDA {
+    for (std::size_t g = 0; g < G; ++g) hn::Store(accumulated[g], d, values + g * kLanes);
+    for (int side = 0; side < 2; ++side) {
+      const bool forward = side == 0;
+      // Steps firstStep..firstStep+7, in order.
+      const std::size_t firstStep = forward ? last - 7 : L - 1 - last;
+      auto v0 = hn::Load(d8, blockOf(forward, 0));
+      auto v1 = hn::Load(d8, blockOf(forward, S - 1));
+      if (forward) {
+        v0 = hn::Reverse(d8, v0);
+        v1 = hn::Reverse(d8, v1);
+      }
+      std::int16_t* out = extrinsic + firstStep * S;
+      const std::int16_t* lus = lu + firstStep * S;
+      if (S == 1) {
+        hn::StoreU(hn::Sub(v0, hn::LoadU(d8, lus)), d8, out);
+      } else {
+        hn::StoreU(hn::Sub(hn::InterleaveLower(d8, v0, v1), hn::LoadU(d8, lus)), d8, out);
+        hn::StoreU(hn::Sub(hn::InterleaveUpper(d8, v0, v1), hn::LoadU(d8, lus + 8)), d8, out + 8);
+      }
+    }
+  };
+  const auto flushPartly = [&](std::size_t last, std::size_t count) {
+    for (std::size_t g = 0; g < G; ++g) hn::Store(accumulated[g], d, values + g * kLanes);
+    for (std::size_t s = 0; s < S; ++s) {
+      for (std::size_t i = 0; i < count; ++i) {
+        const std::size_t forward = (last - i) * S + s;
+        const std::size_t backward = (L - 1 - (last - i)) * S + s;
+        extrinsic[forward] = static_cast<std::int16_t>(blockOf(true, s)[i] - lu[forward]);
+        extrinsic[backward] = static_cast<std::int16_t>(blockOf(false, s)[i] - lu[backward]);
+      }
+    }
+  };
+  const std::true_type yes;
+  const std::false_type no;
+  std::size_t t = 0;
+  for (; t < L / 2; ++t) time(t, yes, no);
+  std::size_t count = 0;
+  if (L % 2 != 0) {  // the middle time stores and reads its own metrics
+    time(t++, yes, yes);
+    count = 1;
+  }
+  for (; t < L; ++t) {
+    time(t, no, yes);
+    if (++count == 8) {
+      flush(t);
+      count = 0;
+    }
+  }
+  if (count != 0) flushPartly(L - 1, count);
+  for (std::size_t g = 0; g < G; ++g) hn::Store(m[g], d, metrics + g * kLanes);
+}
+
+// quads + 4*S*k = the quads [0, Lu, Lp, Lu+Lp] of step k of each segment, from rows of S
+// lanes.
+HWY_NOINLINE void buildQuads(const std::int16_t* HWY_RESTRICT lu,
+                             const std::int16_t* HWY_RESTRICT lp, std::size_t L, std::size_t S,
+                             std::int16_t* HWY_RESTRICT quads) {
+  const hn::CappedTag<std::int16_t, 8> d8;
+  const hn::Repartition<std::int32_t, decltype(d8)> d32;
+  const std::size_t steps = 8 / S;  // per vector
+  std::size_t k = 0;
+  for (; k + steps <= L; k += steps) {
+    const auto u = hn::Load(d8, lu + S * k);
+    const auto p = hn::Load(d8, lp + S * k);
+    const auto both = hn::Add(u, p);
+    std::int16_t* out = quads + 4 * S * k;
+    for (int half = 0; half < 2; ++half) {
+      const auto zeroLu = hn::BitCast(d32, half == 0 ? hn::InterleaveLower(d8, hn::Zero(d8), u)
+                                                     : hn::InterleaveUpper(d8, hn::Zero(d8), u));
+      const auto lpBoth = hn::BitCast(d32, half == 0 ? hn::InterleaveLower(d8, p, both)
+                                                     : hn::InterleaveUpper(d8, p, both));
+      hn::Store(hn::BitCast(d8, hn::InterleaveLower(d32, zeroLu, lpBoth)), d8, out + 16 * half);
+      hn::Store(hn::BitCast(d8, hn::InterleaveUpper(d32, zeroLu, lpBoth)), d8, out + 16 * half + 8);
+    }
+  }
+  for (; k < L; ++k) {
+    for (std::size_t s = 0; s < S; ++s) {
+      std::int16_t* q = quads + 4 * (S * k + s);
+      q[0] = 0;
+      q[1] = lu[S * k + s];
+      q[2] = lp[S * k + s];
+      q[3] = static_cast<std::int16_t>(q[1] + q[2]);
+    }
+  }
+}
+
+// Carries values of one decoder's order into the other's in rows of S = 1 or 2 lanes: row k
+// is row source[k] of the other order, its two lanes swapped where the windows' QPP
+// interleaving swaps them (P = 2); then out[j] = output(value, j), vector by vector.
+template <class Output>
+HWY_NOINLINE void permuteRows(Output output, const VectorWorkspace& work, int toDecoder,
+                              std::size_t L, std::size_t S, const std::int16_t* HWY_RESTRICT from,
+                              std::int16_t* HWY_RESTRICT out) {
+  const std::uint16_t* source = work.sourceStep[toDecoder].get();
+  if (S == 1) {
+    for (std::size_t k = 0; k < L; ++k) out[k] = from[source[k]];
+  } else {
+    const std::uint8_t* rotation = work.laneSwap[toDecoder].get();
+    for (std::size_t k = 0; k < L; ++k) {
+      std::uint32_t row;
+      std::memcpy(&row, from + 2 * source[k], sizeof(row));
+      row = std::rotr(row, rotation[k]);
+      std::memcpy(out + 2 * k, &row, sizeof(row));
+    }
+  }
+  const hn::CappedTag<std::int16_t, 32> d;
+  for (std::size_t j = 0; j < L * S; j += hn::Lanes(d)) {
+    hn::Store(output(hn::Load(d, out + j), j), d, out + j);
+  }
+}
+
+// Decodes a group of S = 1 or 2 segments with the states across the lanes, in the widest
+// registers their 2S recursions fill.
+template <class Combine>
+void decodeStateLaneGroup(const Combine& combine, VectorWorkspace& work,
+                          const CodeBlock* const* blocks, std::size_t count) {
+  const std::size_t K = blocks[0]->row->K;
+  const std::size_t P = work.processingUnits;
+  const std::size_t S = count * P;
+  const std::size_t L = K / P;
+  const std::size_t positions = L * S;
+  if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
+  std::int16_t* sys[2] = {work.systematic[0].get(), work.systematic[1].get()};
+  std::int16_t* par[2] = {work.parity[0].get(), work.parity[1].get()};
+  std::int16_t* lu = work.lu.get();
+  std::int16_t* extrinsic = work.extrinsic.get();
+  // Into rows of S lanes: d0, d1, d2 of every segment, saturated to -128..127.
+  const hn::CappedTag<std::int16_t, 8> d8;
+  std::int16_t* arrays[3] = {sys[0], par[0], par[1]};
+  for (int stream = 0; stream < 3; ++stream) {
+    const std::int32_t* in[2];
+    for (std::size_t s = 0; s < S; ++s) {
+      const CodeBlock& block = *blocks[s / P];
+      const std::int32_t* streams[3] = {block.d0, block.d1, block.d2};
+      in[s] = streams[stream] + s % P * L;
+    }
+    std::int16_t* out = arrays[stream];
+    std::size_t k = 0;
+    for (; k + 8 <= L; k += 8) {
+      const auto a = loadSoftValues(d8, in[0] + k);
+      if (S == 1) {
+        hn::StoreU(a, d8, out + k);
+      } else {
+        const auto b = loadSoftValues(d8, in[1] + k);
+        hn::StoreU(hn::InterleaveLower(d8, a, b), d8, out + 2 * k);
+        hn::StoreU(hn::InterleaveUpper(d8, a, b), d8, out + 2 * k + 8);
+      }
+    }
+    for (; k < L; ++k) {
+      for (std::size_t s = 0; s < S; ++s) out[k * S + s] = softValue(in[s][k]);
+    }
+  }
+  const auto copy = [](auto moved, std::size_t) { return moved; };
+  permuteRows(copy, work, 1, L, S, sys[0], sys[1]);
+  const GroupBoundaries ends = startBoundaries(work, blocks, count);
+
+  const hn::CappedTag<std::int16_t, 32> wide;
+  const hn::CappedTag<std::int16_t, 16> narrow;
+  const std::size_t lanes = S == 2 && hn::Lanes(wide) == 32 ? 32 : 16;
+  const std::size_t windows = lanes / 16;  // per register
+  HWY_ALIGN std::int16_t metrics[2 * 32];
+  const auto metricsOf = [&](std::size_t s) {
+    return metrics + s / windows * lanes + s % windows * 8;
+  };
+  const auto halfIteration = [&](int decoder) {
+    buildQuads(lu, par[decoder], L, S, work.quads.get());
+    for (std::size_t s = 0; s < S; ++s) {
+      for (int i = 0; i < kStates; ++i) {
+        metricsOf(s)[i] = ends.alphaStart(decoder, s).m[i];
+        metricsOf(s)[lanes / 2 + i] = ends.betaEnd(decoder, s).m[i];
+      }
+    }
+    const std::int16_t* quads = work.quads.get();
+    std::int16_t* rows = work.alpha.get();
+    if (lanes == 32) {
+      decodeStateLanes<1>(wide, combine, quads, lu, L, S, rows, metrics, extrinsic);
+    } else if (S == 2) {
+      decodeStateLanes<2>(narrow, combine, quads, lu, L, S, rows, metrics, extrinsic);
+    } else {
+      decodeStateLanes<1>(narrow, combine, quads, lu, L, S, rows, metrics, extrinsic);
+    }
+    for (std::size_t s = 0; s < S; ++s) {
+      const std::int16_t* alpha = metricsOf(s);
+      const std::int16_t* beta = metricsOf(s) + lanes / 2;
+      StateMetrics alphaEnd, betaStart;
+      for (int i = 0; i < kStates; ++i) {
+        alphaEnd.m[i] = static_cast<Metric>(alpha[i] - alpha[0]);
+        betaStart.m[i] = static_cast<Metric>(beta[i] - beta[0]);
+      }
+      ends.reached(decoder, s, alphaEnd, betaStart);
+    }
+    ends.keep(decoder);
+  };
+  const APriori aPriori(work);
+  const auto toDecoder = [&](int decoder) {
+    const std::int16_t* systematic = sys[decoder];
+    const auto aPrioriPlusSystematic = [aPriori, systematic](auto moved, std::size_t at) {
+      return hn::Add(hn::Load(hn::DFromV<decltype(moved)>(), systematic + at), aPriori(moved));
+    };
+    permuteRows(aPrioriPlusSystematic, work, decoder, L, S, extrinsic, lu);
+  };
+  std::copy_n(sys[0], positions, lu);
+  const std::uint32_t iterations = blocks[0]->iterations;
+  for (std::uint32_t iteration = 0; iteration < iterations; ++iteration) {
+    halfIteration(0);
+    toDecoder(1);
+    halfIteration(1);
+    if (iteration + 1 < iterations) toDecoder(0);
+  }
+  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1.
+  for (std::size_t j = 0; j < positions; j += hn::Lanes(wide)) {
+    hn::Store(hn::Add(hn::Load(wide, lu + j), hn::Load(wide, extrinsic + j)), wide, extrinsic + j);
+  }
+  const auto decide = [](auto sum, std::size_t) {
+    return hn::Add(hn::ShiftRight<15>(sum), hn::Set(hn::DFromV<decltype(sum)>(), 1));
+  };
+  permuteRows(decide, work, 0, L, S, extrinsic, lu);
+  std::uint8_t* target[2];
+  for (std::size_t s = 0; s < S; ++s) target[s] = blocks[s / P]->bits + s % P * L;
+  const hn::Rebind<std::uint8_t, decltype(narrow)> bytes16;
+  const hn::Repartition<std::uint8_t, decltype(d8)> bytes8;
+  HWY_ALIGN static constexpr std::uint8_t kEvenOdd[16] = {0, 2, 4, 6, 8, 10, 12, 14,
+                                                          1, 3, 5, 7, 9, 11, 13, 15};
+  std::size_t k = 0;
+  for (; k + 8 <= L; k += 8) {
+    const auto bits = hn::DemoteTo(bytes16, hn::LoadU(narrow, lu + S * k));  // 8 * S
+    if (S == 1) {
+      hn::StoreU(hn::LowerHalf(bits), hn::Rebind<std::uint8_t, decltype(d8)>(), target[0] + k);
+    } else {
+      const auto split = hn::TableLookupBytes(bits, hn::Load(bytes8, kEvenOdd));
+      hn::StoreU(hn::LowerHalf(split), hn::Rebind<std::uint8_t, decltype(d8)>(), target[0] + k);
+      hn::StoreU(hn::UpperHalf(hn::Rebind<std::uint8_t, decltype(d8)>(), split),
+                 hn::Rebind<std::uint8_t, decltype(d8)>(), target[1] + k);
+    }
+  }
+  for (; k < L; ++k) {
+    for (std::size_t s = 0; s < S; ++s) target[s][k] = static_cast<std::uint8_t>(lu[S * k + s]);
+  }
+}
+#endif  // HWY_TARGET <= HWY_AVX2
 
 // Decodes a group in lane groups of d's width; a group that fills at most half of dPaired's
 // lanes runs the paired recursions in dPaired's registers.
@@ -746,9 +913,6 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   // The paired recursions store both metrics of every step: only while that fits 1 MiB.
   const bool paired = laneGroups == 1 && hn::Lanes(dPaired) == 2 * N &&
                       7 * 2 * N * L * sizeof(std::int16_t) <= (std::size_t{1} << 20);
-  // One or two windows run with the states across the lanes where registers hold at least
-  // two blocks.
-  const bool stateLanes = S <= 2 && HWY_TARGET <= HWY_AVX2;
   // Every second alpha stored when all would take more than 1 MiB.
   const int strideShift = 7 * N * L * sizeof(std::int16_t) > (std::size_t{1} << 20) ? 1 : 0;
   if (work.tablesK != K) buildStepTables(work, *blocks[0]->row);
@@ -762,11 +926,10 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   // the blocks' arrays and the lanes eight segments by eight steps at a time, transposed in
   // registers (missing segments read zeros and write to a sink), and the last steps one by
   // one.
-  // A group of full lane groups makes its Lu in the forward recursion (see
-  // decodeLaneGroup), the others in a pass of their own (permuteSteps). The first a priori
-  // values come from zero extrinsic values.
-  const bool exchangeInRecursion = !stateLanes && !paired;
-  if (stateLanes || exchangeInRecursion) std::fill_n(extrinsic, positions, std::int16_t{0});
+  // The lane-per-window recursions make each step's Lu in the forward recursion (see
+  // decodeLaneGroup), the paired ones in a pass of their own (permuteSteps). The first a
+  // priori values come from zero extrinsic values.
+  if (!paired) std::fill_n(extrinsic, positions, std::int16_t{0});
   if (S % N != 0) {
     std::fill_n(sys[0], positions, std::int16_t{0});
     std::fill_n(par[0], positions, std::int16_t{0});
@@ -800,49 +963,17 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   }
   const auto copy = [](auto moved, std::size_t) { return moved; };
   permuteSteps(d, copy, work, 1, laneGroups, L, sys[0], sys[1]);
-  for (std::size_t b = 0; b < count; ++b) {
-    StateMetrics betas[2];
-    tailBetas(*blocks[b], betas);
-    work.tails[2 * b] = betas[0];
-    work.tails[2 * b + 1] = betas[1];
-  }
-  StateMetrics* boundaries = work.boundaries.get();
-  const std::size_t segments = work.maxSegments;
-  for (std::size_t i = 0; i < 8 * segments; ++i) boundaries[i] = StateMetrics{};
-  const StateMetrics start = knownStateZero();
+  const GroupBoundaries ends = startBoundaries(work, blocks, count);
 
   const APriori aPriori(work);
   const auto halfIteration = [&](const auto& combine, int decoder) {
-    StateMetrics* alphaIn = boundaries + (4 * decoder + 0) * segments;
-    StateMetrics* betaIn = boundaries + (4 * decoder + 1) * segments;
-    StateMetrics* alphaOut = boundaries + (4 * decoder + 2) * segments;
-    StateMetrics* betaOut = boundaries + (4 * decoder + 3) * segments;
     std::int16_t* states = work.laneStates.get();
-    if (stateLanes) {
-      StateMetrics starts[2], ends[2], reached[4];
-      for (std::size_t s = 0; s < S; ++s) {
-        const std::size_t w = s % P;
-        starts[s] = w == 0 ? start : alphaIn[s];
-        ends[s] = w == P - 1 ? work.tails[2 * (s / P) + decoder] : betaIn[s + 1];
-      }
-#if HWY_TARGET <= HWY_AVX2
-      decodeWindowsStateLanes(combine, work, lu, par[decoder], L, S, starts, ends, reached,
-                              extrinsic);
-#endif
-      for (std::size_t s = 0; s < S; ++s) {
-        alphaOut[s + 1] = reached[2 * s];
-        betaOut[s] = reached[2 * s + 1];
-      }
-    }
-    for (std::size_t group = 0; group < laneGroups && !stateLanes; ++group) {
+    for (std::size_t group = 0; group < laneGroups; ++group) {
       for (std::size_t lane = 0; lane < N; ++lane) {
         const std::size_t s = group * N + lane;
-        const std::size_t w = s % P;
-        const bool used = s < S;
         const StateMetrics zero{};
-        const StateMetrics& a = !used ? zero : (w == 0 ? start : alphaIn[s]);
-        const StateMetrics& bt =
-            !used ? zero : (w == P - 1 ? work.tails[2 * (s / P) + decoder] : betaIn[s + 1]);
+        const StateMetrics& a = s < S ? ends.alphaStart(decoder, s) : zero;
+        const StateMetrics& bt = s < S ? ends.betaEnd(decoder, s) : zero;
         for (int m = 0; m < kStates; ++m) {
           states[m * N + lane] = a.m[m];
           states[(8 + m) * N + lane] = bt.m[kSigma[m]];
@@ -860,47 +991,26 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
                         extrinsic + first);
       }
       for (std::size_t lane = 0; lane < N && group * N + lane < S; ++lane) {
-        const std::size_t s = group * N + lane;
+        StateMetrics alphaEnd, betaStart;
         for (int m = 0; m < kStates; ++m) {
-          alphaOut[s + 1].m[m] = states[m * N + lane];
-          betaOut[s].m[kSigma[m]] = states[(8 + m) * N + lane];
+          alphaEnd.m[m] = states[m * N + lane];
+          betaStart.m[kSigma[m]] = states[(8 + m) * N + lane];
         }
+        ends.reached(decoder, group * N + lane, alphaEnd, betaStart);
       }
     }
-    for (std::size_t s = 0; s < S; ++s) {
-      if (s % P != 0) {
-        alphaIn[s] = alphaOut[s];
-        betaIn[s] = betaOut[s];
-      }
-    }
+    ends.keep(decoder);
   };
   const auto toDecoder = [&](int decoder) {
-    if (exchangeInRecursion) return;
+    if (!paired) return;
     const std::int16_t* systematic = sys[decoder];
     const auto aPrioriPlusSystematic = [aPriori, systematic](auto moved, std::size_t at) {
       return hn::Add(hn::Load(hn::DFromV<decltype(moved)>(), systematic + at), aPriori(moved));
     };
-#if HWY_TARGET <= HWY_AVX2
-    if (stateLanes) {  // the quads of the state-lane recursions as well
-      const std::int16_t* lp = par[decoder];
-      std::int16_t* quads = work.quads.get();
-      const auto withQuads = [aPrioriPlusSystematic, lp, quads](auto moved, std::size_t at) {
-        const auto lus = aPrioriPlusSystematic(moved, at);
-        const hn::DFromV<decltype(moved)> dv;
-        hn::Store(quadsOf(lus, hn::Load(dv, lp + at)), dv, quads + at);
-        return lus;
-      };
-      permuteSteps(d, withQuads, work, decoder, laneGroups, L, extrinsic, lu);
-      return;
-    }
-#endif
     permuteSteps(d, aPrioriPlusSystematic, work, decoder, laneGroups, L, extrinsic, lu);
   };
   const auto iterate = [&](const auto& combine) {
     std::copy_n(sys[0], positions, lu);
-#if HWY_TARGET <= HWY_AVX2
-    if (stateLanes) buildQuads(hn::CappedTag<std::int16_t, 32>(), lu, par[0], L, work.quads.get());
-#endif
     for (std::uint32_t iteration = 0; iteration < iterations; ++iteration) {
       halfIteration(combine, 0);
       toDecoder(1);
@@ -951,7 +1061,18 @@ void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::siz
     return;
   }
   const std::size_t maxLanes = hn::Lanes(hn::ScalableTag<std::int16_t>());
-  const std::size_t lanes = laneGroupWidth(count * work.processingUnits, maxLanes);
+  const std::size_t segments = count * work.processingUnits;
+#if HWY_TARGET <= HWY_AVX2
+  if (segments <= 2) {  // the states across the lanes
+    if (work.algorithm == Algorithm::LogMap) {
+      decodeStateLaneGroup(LogMapCombine{&work}, work, blocks, count);
+    } else {
+      decodeStateLaneGroup(MaxCombine{}, work, blocks, count);
+    }
+    return;
+  }
+#endif
+  const std::size_t lanes = laneGroupWidth(segments, maxLanes);
   if (lanes <= 8) {
     decodeGroupWith(hn::CappedTag<std::int16_t, 8>(), hn::CappedTag<std::int16_t, 16>(), work,
                     blocks, count);
@@ -1013,7 +1134,8 @@ bool VectorDecoder::init(const DecoderConfig& config, const CorrectionTable& cor
             work.zeros.allocate(K + 8) && work.sink.allocate(K);
   for (int decoder = 0; decoder < 2; ++decoder) {
     ok = ok && work.systematic[decoder].allocate(n) && work.parity[decoder].allocate(n) &&
-         work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L);
+         work.sourceStep[decoder].allocate(L) && work.lanePattern[decoder].allocate(16 * L) &&
+         work.laneSwap[decoder].allocate(L);
   }
   if (!ok || !work.oneLane.init(config)) return false;
   std::fill_n(work.zeros.get(), K + 8, 0);

@@ -24,9 +24,8 @@
 // fewer lanes, so on AVX2 and AVX-512 they run with the states across the lanes instead:
 // the eight metrics of one recursion in one 128-bit block, the forward and backward
 // recursions of the windows in the lower and upper halves of one or two registers, the
-// extrinsic values formed during the second half of the steps (see decodeStateLanes). The
-// arrays and the exchange between the half-iterations keep the layout above (rows of eight
-// lanes).
+// extrinsic values formed during the second half of the steps (see decodeStateLanes). Their
+// values lie in rows of one or two lanes, which the exchange moves one by one.
 //
 // Widths. ConstituentDecoder.h argues the widths of the reference's metrics, normalised
 // every step; the lane-per-window recursions keep exactly those. The state-lane recursions
@@ -119,6 +118,7 @@ struct VectorWorkspace {
   // and the 16 byte indices that move them between the lanes (see permuteSteps).
   AlignedArray<std::uint16_t> sourceStep[2];
   AlignedArray<std::uint8_t> lanePattern[2];
+  AlignedArray<std::uint8_t> laneSwap[2];  // the same for rows of two windows: 0 or 16 bits
   AlignedArray<std::int16_t> alpha;       // forward metrics of one lane group
   AlignedArray<std::int16_t> quads;       // branch metric quads of the state-lane recursions
   AlignedArray<std::int16_t> laneStates;  // 2 x 8 x 32 boundary metrics of a lane group
