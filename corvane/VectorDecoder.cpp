@@ -252,8 +252,8 @@ HWY_INLINE void prefetchStep(D d, const StepSource& step, std::size_t k, std::si
 // other decoder's raw extrinsic value (the exchange of permuteSteps), and stores it in lu;
 // the backward recursion then overwrites those extrinsic values with its own.
 template <class D, class Combine>
-HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource& exchange,
-                                  const APriori& aPriori,
+HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource exchange,
+                                  const APriori aPriori,
                                   const std::int16_t* HWY_RESTRICT systematic,
                                   std::int16_t* HWY_RESTRICT lu,
                                   const std::int16_t* HWY_RESTRICT lp, std::size_t length,
@@ -266,15 +266,22 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource&
   const V zero = hn::Zero(d);
   V a[kStates], r[kStates];
   forStates1To7([&](int m) { a[m] = hn::Load(d, states + m * N); });
+  // Each step's Lu is made one step ahead, so that the recursion does not wait for it.
+  const auto luOf = [&](std::size_t k) {
+    const V g = hn::Add(hn::Load(d, systematic + k * N), aPriori(movedStep(d, exchange, k)));
+    hn::Store(g, d, lu + k * N);
+    return g;
+  };
+  V g = luOf(0);
   for (std::size_t k = 0; k < length; ++k) {
     prefetchStep(d, exchange, k + kPrefetchDistance, length);
     if ((k & strideMask) == 0) {
       std::int16_t* store = alphaStore + (k >> strideShift) * 7 * N;
       forStates1To7([&](int m) { hn::Store(a[m], d, store + (m - 1) * N); });
     }
-    const V g = hn::Add(hn::Load(d, systematic + k * N), aPriori(movedStep(d, exchange, k)));
-    hn::Store(g, d, lu + k * N);
+    const V next = k + 1 < length ? luOf(k + 1) : g;
     trellisStep(combine, a, zero, g, hn::Load(d, lp + k * N));
+    g = next;
   }
   forStates1To7([&](int m) { hn::Store(a[m], d, states + m * N); });
   forStates1To7([&](int m) { r[m] = hn::Load(d, states + (8 + m) * N); });
