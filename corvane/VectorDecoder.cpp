@@ -151,13 +151,38 @@ HWY_INLINE void trellisStep(const Combine& combine, V (&m)[kStates], V zero, V g
   m[7] = hn::Sub(n7, n0);
 }
 
-// extrinsicStep from alpha_k (alpha(i) for i = 1..7) and relabelled beta_k+1 (r[1..7]),
-// alpha_0 = beta_0 = 0, one group of equal u after the other (combine4 within each group of
+// The same step from metrics not normalised (m[0] too), without normalising.
+template <class Combine, class V>
+HWY_INLINE void trellisStepFrom(const Combine& combine, V (&m)[kStates], V g, V p) {
+  const V both = hn::Add(g, p);
+  V n0, n1, n2, n3, n4, n5, n6, n7;
+  combine.pair(m[0], hn::Add(m[1], both), hn::Add(m[0], both), m[1], n0, n4);
+  combine.pair(hn::Add(m[2], g), hn::Add(m[3], p), hn::Add(m[2], p), hn::Add(m[3], g), n1, n5);
+  combine.pair(hn::Add(m[4], p), hn::Add(m[5], g), hn::Add(m[4], g), hn::Add(m[5], p), n2, n6);
+  combine.pair(hn::Add(m[6], both), m[7], m[6], hn::Add(m[7], both), n3, n7);
+  m[0] = n0;
+  m[1] = n1;
+  m[2] = n2;
+  m[3] = n3;
+  m[4] = n4;
+  m[5] = n5;
+  m[6] = n6;
+  m[7] = n7;
+}
+
+// Subtracts the metric of state 0 from all eight.
+template <class V>
+HWY_INLINE void normalise(V (&m)[kStates], V zero) {
+  forStates1To7([&](int i) { m[i] = hn::Sub(m[i], m[0]); });
+  m[0] = zero;
+}
+
+// extrinsicStep from alpha_k (alpha(i) for i = 1..7, alpha_0 = 0) and relabelled beta_k+1
+// (r[0..7]), one group of equal u after the other (combine4 within each group of
 // equal (u, p), then the two parity groups), so that few values are live at once.
 template <class Combine, class Alpha, class V>
-HWY_INLINE V extrinsicOf(const Combine& combine, const Alpha& alpha, const V (&r)[kStates], V zero,
-                         V p) {
-  const V b1 = r[4], b2 = r[2], b3 = r[6], b4 = r[1], b5 = r[5], b6 = r[3], b7 = r[7];
+HWY_INLINE V extrinsicOf(const Combine& combine, const Alpha& alpha, const V (&r)[kStates], V p) {
+  const V b0 = r[0], b1 = r[4], b2 = r[2], b3 = r[6], b4 = r[1], b5 = r[5], b6 = r[3], b7 = r[7];
   if constexpr (std::is_same_v<Combine, MaxCombine>) {
     // Max-log-MAP: the maxima may be taken in any order, so each alpha goes into the
     // maxima of both its branches while it is loaded (u = 1 groups one0/one1 by parity).
@@ -167,8 +192,8 @@ HWY_INLINE V extrinsicOf(const Combine& combine, const Alpha& alpha, const V (&r
     zero1 = hn::Max(zero1, hn::Add(alpha(4), b2));
     one0 = hn::Max(one0, hn::Add(alpha(5), b2));
     zero1 = hn::Max(zero1, hn::Add(alpha(5), b6));
-    V zero0 = hn::Max(zero, hn::Add(alpha(1), b4));
-    V one1 = hn::Max(b4, alpha(1));
+    V zero0 = hn::Max(b0, hn::Add(alpha(1), b4));
+    V one1 = hn::Max(b4, hn::Add(alpha(1), b0));
     zero0 = hn::Max(zero0, hn::Add(alpha(6), b7));
     one1 = hn::Max(one1, hn::Add(alpha(6), b3));
     zero0 = hn::Max(zero0, hn::Add(alpha(7), b3));
@@ -178,9 +203,9 @@ HWY_INLINE V extrinsicOf(const Combine& combine, const Alpha& alpha, const V (&r
   V x, y, z, w, one0, one1, zero0, zero1, one, none;
   combine.pair(hn::Add(alpha(2), b1), hn::Add(alpha(3), b5), hn::Add(alpha(4), b6),
                hn::Add(alpha(5), b2), x, y);
-  combine.pair(b4, alpha(1), hn::Add(alpha(6), b3), hn::Add(alpha(7), b7), z, w);
+  combine.pair(b4, hn::Add(alpha(1), b0), hn::Add(alpha(6), b3), hn::Add(alpha(7), b7), z, w);
   combine.pair(x, y, z, w, one0, one1);
-  combine.pair(zero, hn::Add(alpha(1), b4), hn::Add(alpha(6), b7), hn::Add(alpha(7), b3), x, y);
+  combine.pair(b0, hn::Add(alpha(1), b4), hn::Add(alpha(6), b7), hn::Add(alpha(7), b3), x, y);
   combine.pair(hn::Add(alpha(2), b5), hn::Add(alpha(3), b1), hn::Add(alpha(4), b2),
                hn::Add(alpha(5), b6), z, w);
   combine.pair(x, y, z, w, zero0, zero1);
@@ -285,6 +310,7 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource 
   }
   forStates1To7([&](int m) { hn::Store(a[m], d, states + m * N); });
   forStates1To7([&](int m) { r[m] = hn::Load(d, states + (8 + m) * N); });
+  r[0] = zero;
   HWY_ALIGN std::int16_t made[7 * 32];  // an alpha not stored, made again
   for (std::size_t k = length; k-- > 0;) {
     const std::size_t stored = k & ~strideMask;
@@ -300,9 +326,11 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource 
     const V g = hn::Load(d, lu + k * N);
     const V p = hn::Load(d, lp + k * N);
     const auto alphaOf = [&](int m) { return hn::Load(d, alpha + (m - 1) * N); };
-    hn::Store(extrinsicOf(combine, alphaOf, r, zero, p), d, extrinsic + k * N);
-    trellisStep(combine, r, zero, p, g);
+    hn::Store(extrinsicOf(combine, alphaOf, r, p), d, extrinsic + k * N);
+    trellisStepFrom(combine, r, p, g);
+    if (k % kNormalisationPeriod == 0) normalise(r, zero);
   }
+  normalise(r, zero);
   forStates1To7([&](int m) { hn::Store(r[m], d, states + (8 + m) * N); });
 }
 
@@ -351,7 +379,8 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
       r[i] = hn::ConcatUpperUpper(d, fromK, fromK2);
     });
     const V p = hn::Combine(d, hn::Load(dh, lp + k2 * N), hn::Load(dh, lp + k * N));
-    const V e = extrinsicOf(combine, [&](int i) { return a[i]; }, r, zero, p);
+    r[0] = zero;
+    const V e = extrinsicOf(combine, [&](int i) { return a[i]; }, r, p);
     hn::Store(hn::UpperHalf(dh, e), dh, extrinsic + k2 * N);
     hn::Store(hn::LowerHalf(dh, e), dh, extrinsic + k * N);
   }

@@ -28,8 +28,10 @@
 // values lie in rows of one or two lanes, which the exchange moves one by one.
 //
 // Widths. ConstituentDecoder.h argues the widths of the reference's metrics, normalised
-// every step; the lane-per-window recursions keep exactly those. The state-lane recursions
-// normalise only every kNormalisationPeriod = 4 steps, and their branch sums count u * Lu.
+// every step. The vectorised decoder normalises its backward recursions, and the state-lane
+// recursions both ways, only every kNormalisationPeriod = 4 steps (the extrinsic values and
+// the next metrics depend only on differences within a step; the boundary metrics handed to
+// the next iteration are normalised), and the state-lane branch sums count u * Lu.
 // Per step the largest metric rises by at most 1279 + 44 and falls by at most 640 (of the
 // two branches leaving a state, with (u, p) and (1-u, 1-p), one has at least (Lu + Lp) / 2);
 // the metrics of reachable states span at most 3 * 1279 + 3 * 44 from the third step of a
@@ -73,7 +75,8 @@ inline std::size_t laneGroupWidth(std::size_t segments, std::size_t maxLanes) {
   return lanes;
 }
 
-// Steps between the normalisations of the state-lane recursions (see the widths above).
+// Steps between the normalisations of the backward and the state-lane recursions (see the
+// widths above).
 constexpr std::size_t kNormalisationPeriod = 4;
 
 // An array of T aligned for the widest vectors, freed with the aligned delete.
