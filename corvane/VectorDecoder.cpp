@@ -628,8 +628,9 @@ HWY_INLINE auto loadBlockDup(DH dh, const std::int16_t* p) {
   }
 }
 
-// The recursions of S windows of length L in G registers of d, from the quads of every step;
-// rows takes the stored metrics (L/2 + 1 times); metrics holds the G registers' starting
+// The recursions of S windows of length L (a multiple of 4: K is a multiple of 8 and P at
+// most 2) in G registers of d, from the quads of every step; rows takes the stored metrics
+// (L/2 times); metrics holds the G registers' starting
 // metrics and takes the reached ones (not normalised). Writes the raw extrinsic values, less
 // the Lu of lu.
 template <std::size_t G, class D, class Combine>
@@ -729,10 +730,6 @@ HWY_NOINLINE void decodeStateLanes(D d, const Combine& combine,
   std::size_t t = 0;
   for (; t < L / 2; ++t) time(t, yes, no);
   std::size_t count = 0;
-  if (L % 2 != 0) {  // the middle time stores and reads its own metrics
-    time(t++, yes, yes);
-    count = 1;
-  }
   for (; t < L; ++t) {
     time(t, no, yes);
     if (++count == 8) {
