@@ -11,8 +11,8 @@
 
 #undef HWY_TARGET_INCLUDE
 #define HWY_TARGET_INCLUDE "VectorDecoder.cpp"
-#include <hwy/foreach_target.h>  // IWYU pragma: keep
 #include <hwy/cache_control.h>
+#include <hwy/foreach_target.h>  // IWYU pragma: keep
 #include <hwy/highway.h>
 
 // Lambdas of the inner loops are inlined even where the compiler's size estimate would not.
@@ -233,6 +233,31 @@ struct APriori {
   }
 };
 
+// What the exchange between the half-iterations makes of the values it moves (see
+// permuteSteps), at position `at`: a step's Lu, systematic + the a priori value of the other
+// decoder's raw extrinsic value; a decision from an a posteriori sum, 1 + (sum >> 15), so 1
+// for a sum of 0 or more; the values unchanged.
+struct LuOf {
+  APriori aPriori;
+  const std::int16_t* systematic;
+  template <class V>
+  HWY_INLINE V operator()(V moved, std::size_t at) const {
+    return hn::Add(hn::Load(hn::DFromV<V>(), systematic + at), aPriori(moved));
+  }
+};
+struct Decision {
+  template <class V>
+  HWY_INLINE V operator()(V sum, std::size_t) const {
+    return hn::Add(hn::ShiftRight<15>(sum), hn::Set(hn::DFromV<V>(), 1));
+  }
+};
+struct Unchanged {
+  template <class V>
+  HWY_INLINE V operator()(V moved, std::size_t) const {
+    return moved;
+  }
+};
+
 // Where the values of a decoder's step come from in the other decoder's order: step
 // source[k] of the same lane group (from), its lanes rearranged within each block's windows
 // by pattern[k] (16 byte indices, repeated in every 128-bit block: the P windows of a block
@@ -268,14 +293,14 @@ HWY_INLINE void prefetchStep(D d, const StepSource& step, std::size_t k, std::si
 
 // One lane group of one half-iteration, lanes = segments: the forward recursion from the
 // alpha metrics in states[0..7] (one row of lanes per state) over `length` steps, storing
-// the alpha of every (2^strideShift)-th step, then the backward recursion from the relabelled beta
-// metrics in states[8..15] with the raw extrinsic value of every step (an alpha not stored
-// is made again from the last stored one). Leaves the reached alpha and (relabelled) beta in
-// states. A stride of 2 halves the store for long windows, which then stays in the cache
-// (shifts, not divisions, index the store).
-// The forward recursion also makes each step's Lu, systematic + the a priori value of the
-// other decoder's raw extrinsic value (the exchange of permuteSteps), and stores it in lu;
-// the backward recursion then overwrites those extrinsic values with its own.
+// the alpha of every (2^strideShift)-th step, then the backward recursion from the
+// relabelled beta metrics in states[8..15] with the raw extrinsic value of every step (an
+// alpha not stored is made again from the last stored one). Leaves the reached alpha and
+// (relabelled) beta in states. A stride of 2 halves the store for long windows, which then
+// stays in the cache. The forward recursion also makes each step's Lu, systematic + the a
+// priori value of the other decoder's raw extrinsic value (the exchange of permuteSteps),
+// and stores it in lu; the backward recursion then overwrites those extrinsic values with
+// its own.
 template <class D, class Combine>
 HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource exchange,
                                   const APriori aPriori,
@@ -292,8 +317,9 @@ HWY_NOINLINE void decodeLaneGroup(D d, const Combine& combine, const StepSource 
   V a[kStates], r[kStates];
   forStates1To7([&](int m) { a[m] = hn::Load(d, states + m * N); });
   // Each step's Lu is made one step ahead, so that the recursion does not wait for it.
+  const LuOf luFrom{aPriori, systematic};
   const auto luOf = [&](std::size_t k) {
-    const V g = hn::Add(hn::Load(d, systematic + k * N), aPriori(movedStep(d, exchange, k)));
+    const V g = luFrom(movedStep(d, exchange, k), k * N);
     hn::Store(g, d, lu + k * N);
     return g;
   };
@@ -380,12 +406,12 @@ HWY_NOINLINE void decodeLaneGroupPaired(D d, const Combine& combine,
     });
     const V p = hn::Combine(d, hn::Load(dh, lp + k2 * N), hn::Load(dh, lp + k * N));
     r[0] = zero;
-    const V e = extrinsicOf(combine, [&](int i) { return a[i]; }, r, p);
+    const V e = extrinsicOf(
+        combine, [&](int i) { return a[i]; }, r, p);
     hn::Store(hn::UpperHalf(dh, e), dh, extrinsic + k2 * N);
     hn::Store(hn::LowerHalf(dh, e), dh, extrinsic + k * N);
   }
 }
-
 
 // Carries values of one decoder's order into the other's (see StepSource): the vector
 // stored at position j of step k is output(moved, j). Rows of eight lanes go several to a
@@ -407,16 +433,20 @@ HWY_NOINLINE void permuteSteps(D d, Output output, const VectorWorkspace& work, 
       const hn::Repartition<std::uint8_t, decltype(wide)> bytes;
       const std::size_t rows = hn::Lanes(wide) / 8;
       for (; k + rows <= L; k += rows) {
-        const auto row = [&](std::size_t r) { return hn::Load(d, step.from + step.source[k + r] * 8); };
+        const auto row = [&](std::size_t r) {
+          return hn::Load(d, step.from + step.source[k + r] * 8);
+        };
         decltype(hn::Zero(wide)) moved;
         if constexpr (hn::MaxLanes(decltype(wide)()) == 32) {
           const hn::Half<decltype(wide)> dh;
-          moved = hn::Combine(wide, hn::Combine(dh, row(3), row(2)), hn::Combine(dh, row(1), row(0)));
+          moved =
+              hn::Combine(wide, hn::Combine(dh, row(3), row(2)), hn::Combine(dh, row(1), row(0)));
         } else {
           moved = hn::Combine(wide, row(1), row(0));
         }
         if (step.permuted) {
-          moved = hn::TableLookupBytes(moved, hn::BitCast(wide, hn::LoadU(bytes, step.pattern + 16 * k)));
+          moved = hn::TableLookupBytes(moved,
+                                       hn::BitCast(wide, hn::LoadU(bytes, step.pattern + 16 * k)));
         }
         hn::Store(output(moved, first + k * 8), wide, out + first + k * 8);
       }
@@ -629,10 +659,9 @@ HWY_INLINE auto loadBlockDup(DH dh, const std::int16_t* p) {
 }
 
 // The recursions of S windows of length L (a multiple of 4: K is a multiple of 8 and P at
-// most 2) in G registers of d, from the quads of every step; rows takes the stored metrics
-// (L/2 times); metrics holds the G registers' starting
-// metrics and takes the reached ones (not normalised). Writes the raw extrinsic values, less
-// the Lu of lu.
+// most 2) in G registers of d, from the quads of every step; rows takes the metrics stored
+// over the first L/2 times; metrics holds the G registers' starting metrics and takes the
+// reached ones (not normalised). Writes the raw extrinsic values, less the Lu of lu.
 template <std::size_t G, class D, class Combine>
 HWY_NOINLINE void decodeStateLanes(D d, const Combine& combine,
                                    const std::int16_t* HWY_RESTRICT quads,
@@ -758,8 +787,8 @@ HWY_NOINLINE void buildQuads(const std::int16_t* HWY_RESTRICT lu,
     for (int half = 0; half < 2; ++half) {
       const auto zeroLu = hn::BitCast(d32, half == 0 ? hn::InterleaveLower(d8, hn::Zero(d8), u)
                                                      : hn::InterleaveUpper(d8, hn::Zero(d8), u));
-      const auto lpBoth = hn::BitCast(d32, half == 0 ? hn::InterleaveLower(d8, p, both)
-                                                     : hn::InterleaveUpper(d8, p, both));
+      const auto lpBoth = hn::BitCast(
+          d32, half == 0 ? hn::InterleaveLower(d8, p, both) : hn::InterleaveUpper(d8, p, both));
       hn::Store(hn::BitCast(d8, hn::InterleaveLower(d32, zeroLu, lpBoth)), d8, out + 16 * half);
       hn::Store(hn::BitCast(d8, hn::InterleaveUpper(d32, zeroLu, lpBoth)), d8, out + 16 * half + 8);
     }
@@ -841,8 +870,7 @@ void decodeStateLaneGroup(const Combine& combine, VectorWorkspace& work,
       for (std::size_t s = 0; s < S; ++s) out[k * S + s] = softValue(in[s][k]);
     }
   }
-  const auto copy = [](auto moved, std::size_t) { return moved; };
-  permuteRows(copy, work, 1, L, S, sys[0], sys[1]);
+  permuteRows(Unchanged(), work, 1, L, S, sys[0], sys[1]);
   const GroupBoundaries ends = startBoundaries(work, blocks, count);
 
   const hn::CappedTag<std::int16_t, 32> wide;
@@ -884,11 +912,7 @@ void decodeStateLaneGroup(const Combine& combine, VectorWorkspace& work,
   };
   const APriori aPriori(work);
   const auto toDecoder = [&](int decoder) {
-    const std::int16_t* systematic = sys[decoder];
-    const auto aPrioriPlusSystematic = [aPriori, systematic](auto moved, std::size_t at) {
-      return hn::Add(hn::Load(hn::DFromV<decltype(moved)>(), systematic + at), aPriori(moved));
-    };
-    permuteRows(aPrioriPlusSystematic, work, decoder, L, S, extrinsic, lu);
+    permuteRows(LuOf{aPriori, sys[decoder]}, work, decoder, L, S, extrinsic, lu);
   };
   std::copy_n(sys[0], positions, lu);
   const std::uint32_t iterations = blocks[0]->iterations;
@@ -898,14 +922,12 @@ void decodeStateLaneGroup(const Combine& combine, VectorWorkspace& work,
     halfIteration(1);
     if (iteration + 1 < iterations) toDecoder(0);
   }
-  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1.
+  // A posteriori value = systematic + a priori + unscaled extrinsic; the decisions go into
+  // natural order in lu, then out of the rows.
   for (std::size_t j = 0; j < positions; j += hn::Lanes(wide)) {
     hn::Store(hn::Add(hn::Load(wide, lu + j), hn::Load(wide, extrinsic + j)), wide, extrinsic + j);
   }
-  const auto decide = [](auto sum, std::size_t) {
-    return hn::Add(hn::ShiftRight<15>(sum), hn::Set(hn::DFromV<decltype(sum)>(), 1));
-  };
-  permuteRows(decide, work, 0, L, S, extrinsic, lu);
+  permuteRows(Decision(), work, 0, L, S, extrinsic, lu);
   std::uint8_t* target[2];
   for (std::size_t s = 0; s < S; ++s) target[s] = blocks[s / P]->bits + s % P * L;
   const hn::Rebind<std::uint8_t, decltype(narrow)> bytes16;
@@ -994,8 +1016,7 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
       }
     }
   }
-  const auto copy = [](auto moved, std::size_t) { return moved; };
-  permuteSteps(d, copy, work, 1, laneGroups, L, sys[0], sys[1]);
+  permuteSteps(d, Unchanged(), work, 1, laneGroups, L, sys[0], sys[1]);
   const GroupBoundaries ends = startBoundaries(work, blocks, count);
 
   const APriori aPriori(work);
@@ -1035,12 +1056,8 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
     ends.keep(decoder);
   };
   const auto toDecoder = [&](int decoder) {
-    if (!paired) return;
-    const std::int16_t* systematic = sys[decoder];
-    const auto aPrioriPlusSystematic = [aPriori, systematic](auto moved, std::size_t at) {
-      return hn::Add(hn::Load(hn::DFromV<decltype(moved)>(), systematic + at), aPriori(moved));
-    };
-    permuteSteps(d, aPrioriPlusSystematic, work, decoder, laneGroups, L, extrinsic, lu);
+    if (paired)
+      permuteSteps(d, LuOf{aPriori, sys[decoder]}, work, decoder, laneGroups, L, extrinsic, lu);
   };
   const auto iterate = [&](const auto& combine) {
     std::copy_n(sys[0], positions, lu);
@@ -1056,15 +1073,12 @@ void decodeGroupWith(D d, DPaired dPaired, VectorWorkspace& work, const CodeBloc
   } else {
     iterate(MaxCombine{});
   }
-  // A posteriori value = systematic + a priori + unscaled extrinsic; 0 or more decides 1.
-  // The decisions, 1 + (sum >> 15), go into natural order in lu, then out of the lanes.
+  // A posteriori value = systematic + a priori + unscaled extrinsic; the decisions go into
+  // natural order in lu, then out of the lanes.
   for (std::size_t j = 0; j < positions; j += N) {
     hn::Store(hn::Add(hn::Load(d, lu + j), hn::Load(d, extrinsic + j)), d, extrinsic + j);
   }
-  const auto decide = [](auto sum, std::size_t) {
-    return hn::Add(hn::ShiftRight<15>(sum), hn::Set(hn::DFromV<decltype(sum)>(), 1));
-  };
-  permuteSteps(d, decide, work, 0, laneGroups, L, extrinsic, lu);
+  permuteSteps(d, Decision(), work, 0, laneGroups, L, extrinsic, lu);
   const hn::Rebind<std::uint8_t, decltype(d8)> bytes8;
   for (std::size_t first = 0; first < S; first += 8) {
     const std::size_t lanes = std::min<std::size_t>(8, S - first);

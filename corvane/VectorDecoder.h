@@ -122,14 +122,14 @@ struct VectorWorkspace {
   AlignedArray<std::uint16_t> sourceStep[2];
   AlignedArray<std::uint8_t> lanePattern[2];
   AlignedArray<std::uint8_t> laneSwap[2];  // the same for rows of two windows: 0 or 16 bits
-  AlignedArray<std::int16_t> alpha;       // forward metrics of one lane group
-  AlignedArray<std::int16_t> quads;       // branch metric quads of the state-lane recursions
-  AlignedArray<std::int16_t> laneStates;  // 2 x 8 x 32 boundary metrics of a lane group
-  AlignedArray<std::int32_t> zeros;       // soft values of missing segments
-  AlignedArray<std::uint8_t> sink;        // decisions of missing segments
-  AlignedArray<std::uint16_t> pi;         // QPP permutation of the group's K
+  AlignedArray<std::int16_t> alpha;        // forward metrics of one lane group
+  AlignedArray<std::int16_t> quads;        // branch metric quads of the state-lane recursions
+  AlignedArray<std::int16_t> laneStates;   // 2 x 8 x 32 boundary metrics of a lane group
+  AlignedArray<std::int32_t> zeros;        // soft values of missing segments
+  AlignedArray<std::uint8_t> sink;         // decisions of missing segments
+  AlignedArray<std::uint16_t> pi;          // QPP permutation of the group's K
   AlignedArray<std::uint16_t> piInverse;
-  std::size_t tablesK = 0;              // the K of pi, sourceStep and lanePattern
+  std::size_t tablesK = 0;  // the K of pi, sourceStep and lanePattern
   // [decoder][alpha, beta, new alpha, new beta][segment]
   std::unique_ptr<StateMetrics[]> boundaries;
   std::unique_ptr<StateMetrics[]> tails;  // [block][decoder]
