@@ -1109,6 +1109,15 @@ void decodeGroup(VectorWorkspace& work, const CodeBlock* const* blocks, std::siz
   }
   const std::size_t maxLanes = hn::Lanes(hn::ScalableTag<std::int16_t>());
   const std::size_t segments = count * work.processingUnits;
+  // Blocks beyond the last full lane group that fill at most half of one are a group of
+  // their own (the blocks are independent), which the paired recursions decode for less.
+  const std::size_t perGroup = std::max<std::size_t>(1, maxLanes / work.processingUnits);
+  const std::size_t rest = count % perGroup;
+  if (count > perGroup && rest != 0 && 2 * rest * work.processingUnits <= maxLanes) {
+    decodeGroup(work, blocks, count - rest);
+    decodeGroup(work, blocks + count - rest, rest);
+    return;
+  }
 #if HWY_TARGET <= HWY_AVX2
   if (segments <= 2) {  // the states across the lanes
     if (work.algorithm == Algorithm::LogMap) {

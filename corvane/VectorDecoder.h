@@ -17,8 +17,9 @@
 // up to 16 windows on AVX-512) runs the forward recursion in the lower half and the
 // backward recursion in the upper half of the same registers, then forms the extrinsic
 // values of two steps per vector, so the lanes are used twice as well, as long as the
-// store of both metrics of every step fits 1 MiB. The other groups make the a priori
-// values of a half-iteration in its forward recursion.
+// store of both metrics of every step fits 1 MiB; the blocks beyond a group's last full
+// lane group form a group of their own when they fill at most half of one. The other
+// groups make the a priori values of a half-iteration in its forward recursion.
 //
 // One or two windows (a single block with P = 1 or 2, or two blocks with P = 1) fill still
 // fewer lanes, so on AVX2 and AVX-512 they run with the states across the lanes instead:
