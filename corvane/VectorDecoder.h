@@ -123,7 +123,7 @@ struct VectorWorkspace {
   AlignedArray<std::uint16_t> sourceStep[2];
   AlignedArray<std::uint8_t> lanePattern[2];
   AlignedArray<std::uint8_t> laneSwap[2];  // the same for rows of two windows: 0 or 16 bits
-  AlignedArray<std::int16_t> alpha;        // forward metrics of one lane group
+  AlignedArray<std::int16_t> alpha;        // forward (or state-lane) metrics of one group
   AlignedArray<std::int16_t> quads;        // branch metric quads of the state-lane recursions
   AlignedArray<std::int16_t> laneStates;   // 2 x 8 x 32 boundary metrics of a lane group
   AlignedArray<std::int32_t> zeros;        // soft values of missing segments
