@@ -16,7 +16,36 @@
 // A group that fills at most half of the widest vector (one block with 8 windows on AVX2,
 // up to 16 windows on AVX-512) runs the forward recursion in the lower half and the
 // backward recursion in the upper half of the same registers, then forms the extrinsic
-// values of two steps per vector, so the lanes are used twice as well.
+// values of two steps per vector, so the lanes are used twice as well, as long as the
+// store of both metrics of every step fits 1 MiB; the blocks beyond a group's last full
+// lane group form a group of their own when they fill at most half of one. The other
+// groups make the a priori values of a half-iteration in its forward recursion.
+//
+// One or two windows (a single block with P = 1 or 2, or two blocks with P = 1) fill still
+// fewer lanes, so on AVX2 and AVX-512 they run with the states across the lanes instead:
+// the eight metrics of one recursion in one 128-bit block, the forward and backward
+// recursions of the windows in the lower and upper halves of one or two registers, the
+// extrinsic values formed during the second half of the steps (see decodeStateLanes). Their
+// values lie in rows of one or two lanes, which the exchange moves one by one.
+//
+// Widths. ConstituentDecoder.h argues the widths of the reference's metrics, normalised
+// every step. The vectorised decoder normalises its backward recursions, and the state-lane
+// recursions both ways, only every kNormalisationPeriod = 4 steps (the extrinsic values and
+// the next metrics depend only on differences within a step; the boundary metrics handed to
+// the next iteration are normalised), and the state-lane branch sums count u * Lu.
+// Per step the largest metric rises by at most 1279 + 44 and falls by at most 640 (of the
+// two branches leaving a state, with (u, p) and (1-u, 1-p), one has at least (Lu + Lp) / 2);
+// the metrics of reachable states span at most 3 * 1279 + 3 * 44 from the third step of a
+// window on and 6615 (that plus two steps' ranges) in its first and last two steps, and in
+// window 0, whose states 1..7 start at -8192, no metric is more than 14000 below the
+// largest. Normalised (state 0 at 0), alpha lies within -14000..6615 and beta within
+// -6615..6615; four steps later alpha lies within -16560..11907 and beta within
+// -9175..11907, a metric plus a branch metric within -17839..13186, and a branch sum
+// alpha + gamma + beta within -27014..25093, a combination of such sums at most 3 * 44
+// above: every sum fits 16 bits. The u = 0 and u = 1 branches leaving one state differ only
+// in beta and Lp, so a raw extrinsic value e has |e| < 6615 + 128 + 132 < 7000; e + Lu
+// (what the state-lane recursions form), 3e (the scaling) and the a posteriori sum
+// systematic + a priori + e (below 8200) fit 16 bits as well.
 //
 // The vector code is compiled for every x86 instruction set Highway knows (SSSE3, SSE4, AVX2,
 // AVX-512) and the best the processor runs is chosen at the first call; on a processor
@@ -46,6 +75,10 @@ inline std::size_t laneGroupWidth(std::size_t segments, std::size_t maxLanes) {
   while (lanes < segments && lanes < 32 && lanes < maxLanes) lanes *= 2;
   return lanes;
 }
+
+// Steps between the normalisations of the backward and the state-lane recursions (see the
+// widths above).
+constexpr std::size_t kNormalisationPeriod = 4;
 
 // An array of T aligned for the widest vectors, freed with the aligned delete.
 template <class T>
@@ -89,12 +122,15 @@ struct VectorWorkspace {
   // and the 16 byte indices that move them between the lanes (see permuteSteps).
   AlignedArray<std::uint16_t> sourceStep[2];
   AlignedArray<std::uint8_t> lanePattern[2];
-  AlignedArray<std::int16_t> alpha;       // forward metrics of one lane group
-  AlignedArray<std::int16_t> laneStates;  // 2 x 8 x 32 boundary metrics of a lane group
-  AlignedArray<std::uint16_t> pi;         // QPP permutation of the group's K
+  AlignedArray<std::uint8_t> laneSwap[2];  // the same for rows of two windows: 0 or 16 bits
+  AlignedArray<std::int16_t> alpha;        // forward (or state-lane) metrics of one group
+  AlignedArray<std::int16_t> quads;        // branch metric quads of the state-lane recursions
+  AlignedArray<std::int16_t> laneStates;   // 2 x 8 x 32 boundary metrics of a lane group
+  AlignedArray<std::int32_t> zeros;        // soft values of missing segments
+  AlignedArray<std::uint8_t> sink;         // decisions of missing segments
+  AlignedArray<std::uint16_t> pi;          // QPP permutation of the group's K
   AlignedArray<std::uint16_t> piInverse;
-  AlignedArray<std::int16_t> received;  // d0, d1, d2 of one block, saturated
-  std::size_t tablesK = 0;              // the K of pi, sourceStep and lanePattern
+  std::size_t tablesK = 0;  // the K of pi, sourceStep and lanePattern
   // [decoder][alpha, beta, new alpha, new beta][segment]
   std::unique_ptr<StateMetrics[]> boundaries;
   std::unique_ptr<StateMetrics[]> tails;  // [block][decoder]
