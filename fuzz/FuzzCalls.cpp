@@ -149,14 +149,20 @@ vexlon_ip_brannoc_state* instanceFor(const vexlon_ip_brannoc_generics& generics)
 }
 
 void runAndCheck(const SchCall& call, vexlon_ip_brannoc_state* state) {
-  // Each array exactly as large as declared, in its own allocation.
+  // Each array exactly as large as declared, in its own allocation, up to 2^20 values: no
+  // call may write more (a transport block has at most 262143 bits and 43 code blocks of
+  // 6148 HARQ values), and a declared capacity of up to 2^32 - 1 must not make the harness
+  // itself run out of memory.
+  static constexpr std::uint32_t kLargestWrite = 1U << 20;
+  const auto allocated = [](std::uint32_t capacity) { return std::min(capacity, kLargestWrite); };
   std::vector<std::int32_t> llr = call.llr;
   std::array<std::vector<std::int32_t>, 3> harqIn = call.harqIn;
   const auto& cap = call.capacities;
-  std::vector<std::uint8_t> data(cap[1]), ack(cap[2]), ri(cap[3]), cqi(cap[4]), cw(cap[5]);
-  std::array<std::vector<std::int32_t>, 3> harqOut{std::vector<std::int32_t>(cap[0]),
-                                                   std::vector<std::int32_t>(cap[0]),
-                                                   std::vector<std::int32_t>(cap[0])};
+  std::vector<std::uint8_t> data(allocated(cap[1])), ack(allocated(cap[2])),
+      ri(allocated(cap[3])), cqi(allocated(cap[4])), cw(allocated(cap[5]));
+  std::array<std::vector<std::int32_t>, 3> harqOut{std::vector<std::int32_t>(allocated(cap[0])),
+                                                   std::vector<std::int32_t>(allocated(cap[0])),
+                                                   std::vector<std::int32_t>(allocated(cap[0]))};
   const auto ptr = [&call](auto& v, std::uint16_t bit) {
     return (call.nulls & bit) != 0 ? nullptr : v.data();
   };
