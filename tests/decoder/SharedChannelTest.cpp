@@ -469,10 +469,13 @@ TEST(SharedChannelOutputs, UnsafeInputsAreReportedOrLeftUnread) {
               "File: ../s/brannoc_bitacc_cmodel.cpp(#)Error: Could not decode SCH\n");
   EXPECT_EQ(tiny.data[0], 9);
 
-  // New data never reads the HARQ input, whatever size it claims.
+  // New data never reads the HARQ input, whatever size it claims, and capacities far beyond
+  // the arrays are only capacities: nothing is written past what the call produces.
   Sent sent = transmit({6, 2, CyclicPrefix::Normal, 600, 0, 0, 0, 0}, {}, 5);
   sent.call.harqSize = 0xFFFFFFFF;
-  sent.call.outputs.max_harq_buffer_size = 0xFFFFFFFF;
+  vexlon_ip_brannoc_SCH_outputs& o = sent.call.outputs;
+  o.max_harq_buffer_size = o.max_SCH_data_out_size = o.max_SCH_ACK_out_size =
+      o.max_SCH_RI_out_size = o.max_SCH_CQI_out_size = o.max_CW_CRC_out_size = 0xFFFFFFFF;
   EXPECT_EQ(sent.call.run(instance.get()), 0);
   EXPECT_EQ(sent.call.outputs.SCH_TB_crc_error, 0);
 
