@@ -134,7 +134,8 @@ void brannoc_dpi_sch_push_llr(void* h, int value) {
 // Appends a value to input HARQ stream 0 (systematic), 1 or 2 (parities).
 void brannoc_dpi_sch_push_harq(void* h, int stream, int value) {
   Handle* x = handle(h);
-  if (x != nullptr && stream >= 0 && stream < 3) push(x, x->sch.harqIn[stream], std::int32_t{value});
+  if (x != nullptr && stream >= 0 && stream < 3)
+    push(x, x->sch.harqIn[stream], std::int32_t{value});
 }
 
 // The last call's HARQ output becomes the next call's HARQ input (a retransmission); call it
@@ -145,7 +146,7 @@ void brannoc_dpi_sch_keep_harq(void* h) {
   for (std::size_t s = 0; s < 3; ++s) {
     c.harqIn[s].assign(c.harqOut[s].begin(),
                        c.harqOut[s].begin() + std::min<std::size_t>(c.outputs.harq_buffer_out_size,
-                                                                     c.harqOut[s].size()));
+                                                                    c.harqOut[s].size()));
   }
 }
 
@@ -183,11 +184,16 @@ int brannoc_dpi_sch_run(void* h) {
   c.outputs.max_SCH_RI_out_size = 4;
   c.outputs.max_SCH_CQI_out_size = 128;
   c.outputs.max_CW_CRC_out_size = 64;
-  const auto ptr = [](const std::vector<std::int32_t>& v) { return v.empty() ? nullptr : v.data(); };
-  const vexlon_ip_brannoc_SCH_inputs inputs{
-      ptr(c.llr),    ptr(c.harqIn[0]), ptr(c.harqIn[1]), ptr(c.harqIn[2]),
-      static_cast<std::uint32_t>(c.llr.size()), static_cast<std::uint32_t>(c.harqIn[0].size()),
-      c.control};
+  const auto ptr = [](const std::vector<std::int32_t>& v) {
+    return v.empty() ? nullptr : v.data();
+  };
+  const vexlon_ip_brannoc_SCH_inputs inputs{ptr(c.llr),
+                                            ptr(c.harqIn[0]),
+                                            ptr(c.harqIn[1]),
+                                            ptr(c.harqIn[2]),
+                                            static_cast<std::uint32_t>(c.llr.size()),
+                                            static_cast<std::uint32_t>(c.harqIn[0].size()),
+                                            c.control};
   c.status = vexlon_ip_brannoc_SCH_bitacc_simulate(handle(h)->state, inputs, &c.outputs);
   return c.status;
 }
@@ -196,8 +202,8 @@ int brannoc_dpi_sch_run(void* h) {
 int brannoc_dpi_sch_size(void* h, int which) {
   if (handle(h) == nullptr) return 0;
   const vexlon_ip_brannoc_SCH_outputs& o = handle(h)->sch.outputs;
-  const std::uint32_t sizes[] = {o.SCH_data_out_size, o.SCH_CQI_out_size,  o.SCH_ACK_out_size,
-                                 o.SCH_RI_out_size,   o.CW_CRC_out_size,   o.harq_buffer_out_size};
+  const std::uint32_t sizes[] = {o.SCH_data_out_size, o.SCH_CQI_out_size, o.SCH_ACK_out_size,
+                                 o.SCH_RI_out_size,   o.CW_CRC_out_size,  o.harq_buffer_out_size};
   return which >= 0 && which < 6 ? static_cast<int>(sizes[which]) : 0;
 }
 
@@ -265,8 +271,9 @@ int brannoc_dpi_cch_run(void* h) {
 int brannoc_dpi_cch_size(void* h, int which) {
   if (handle(h) == nullptr) return 0;
   const vexlon_ip_brannoc_CCH_outputs& o = handle(h)->cch.outputs;
-  return which == 0 ? static_cast<int>(o.CCH_data_out_size)
-                    : which == 1 ? static_cast<int>(o.CCH_ACK_out_size) : 0;
+  return which == 0   ? static_cast<int>(o.CCH_data_out_size)
+         : which == 1 ? static_cast<int>(o.CCH_ACK_out_size)
+                      : 0;
 }
 
 // Bit i of output which (0 CQI, 1 ACK).

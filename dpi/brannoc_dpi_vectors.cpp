@@ -95,7 +95,8 @@ void brannoc_dpi_vector_load(void* v, void* decoder, int load_harq) {
     }
     for (const std::int32_t value : x.shared.llr) brannoc_dpi_sch_push_llr(decoder, value);
     for (int s = 0; s < 3 && load_harq != 0; ++s) {
-      for (const std::int32_t value : x.shared.harq[s]) brannoc_dpi_sch_push_harq(decoder, s, value);
+      for (const std::int32_t value : x.shared.harq[s])
+        brannoc_dpi_sch_push_harq(decoder, s, value);
     }
   } else {
     brannoc_dpi_cch_begin(decoder);

@@ -26,10 +26,20 @@ constexpr std::uint32_t kNumPU[] = {1, 2, 4, 8};
 
 // Null-pointer bits of a shared-channel call.
 enum NullBit : std::uint16_t {
-  kNullLlr = 1 << 0, kNullSysIn = 1 << 1, kNullP0In = 1 << 2, kNullP1In = 1 << 3,
-  kNullData = 1 << 4, kNullAck = 1 << 5, kNullRi = 1 << 6, kNullCqi = 1 << 7,
-  kNullSysOut = 1 << 8, kNullP0Out = 1 << 9, kNullP1Out = 1 << 10, kNullCw = 1 << 11,
-  kNullOutputs = 1 << 12, kNullState = 1 << 13,
+  kNullLlr = 1 << 0,
+  kNullSysIn = 1 << 1,
+  kNullP0In = 1 << 2,
+  kNullP1In = 1 << 3,
+  kNullData = 1 << 4,
+  kNullAck = 1 << 5,
+  kNullRi = 1 << 6,
+  kNullCqi = 1 << 7,
+  kNullSysOut = 1 << 8,
+  kNullP0Out = 1 << 9,
+  kNullP1Out = 1 << 10,
+  kNullCw = 1 << 11,
+  kNullOutputs = 1 << 12,
+  kNullState = 1 << 13,
 };
 
 bool knownSchStatus(std::int32_t s) {
@@ -49,8 +59,8 @@ vexlon_ip_brannoc_generics genericsFromByte(std::uint8_t g) {
 }
 
 std::uint8_t byteFromGenerics(const vexlon_ip_brannoc_generics& g) {
-  const auto pu = static_cast<std::uint8_t>(std::find(std::begin(kNumPU), std::end(kNumPU),
-                                                      g.C_NUM_PU) - std::begin(kNumPU));
+  const auto pu = static_cast<std::uint8_t>(
+      std::find(std::begin(kNumPU), std::end(kNumPU), g.C_NUM_PU) - std::begin(kNumPU));
   return static_cast<std::uint8_t>((pu & 3) | (g.C_ALGORITHM_TYPE & 3) << 2 |
                                    (g.C_INTERLEAVER_BUFFER_SIZE == 18432 ? 0x10 : 0) |
                                    ((g.C_NUM_CQI_PU - 1) & 3) << 5);
@@ -158,17 +168,20 @@ void runAndCheck(const SchCall& call, vexlon_ip_brannoc_state* state) {
   std::vector<std::int32_t> llr = call.llr;
   std::array<std::vector<std::int32_t>, 3> harqIn = call.harqIn;
   const auto& cap = call.capacities;
-  std::vector<std::uint8_t> data(allocated(cap[1])), ack(allocated(cap[2])),
-      ri(allocated(cap[3])), cqi(allocated(cap[4])), cw(allocated(cap[5]));
+  std::vector<std::uint8_t> data(allocated(cap[1])), ack(allocated(cap[2])), ri(allocated(cap[3])),
+      cqi(allocated(cap[4])), cw(allocated(cap[5]));
   std::array<std::vector<std::int32_t>, 3> harqOut{std::vector<std::int32_t>(allocated(cap[0])),
                                                    std::vector<std::int32_t>(allocated(cap[0])),
                                                    std::vector<std::int32_t>(allocated(cap[0]))};
   const auto ptr = [&call](auto& v, std::uint16_t bit) {
     return (call.nulls & bit) != 0 ? nullptr : v.data();
   };
-  const vexlon_ip_brannoc_SCH_inputs inputs{ptr(llr, kNullLlr),         ptr(harqIn[0], kNullSysIn),
-                                            ptr(harqIn[1], kNullP0In),  ptr(harqIn[2], kNullP1In),
-                                            call.llrSize,               call.harqSize,
+  const vexlon_ip_brannoc_SCH_inputs inputs{ptr(llr, kNullLlr),
+                                            ptr(harqIn[0], kNullSysIn),
+                                            ptr(harqIn[1], kNullP0In),
+                                            ptr(harqIn[2], kNullP1In),
+                                            call.llrSize,
+                                            call.harqSize,
                                             call.control};
   vexlon_ip_brannoc_SCH_outputs outputs{};
   outputs.SCH_data_out = ptr(data, kNullData);
@@ -232,7 +245,11 @@ void runAndCheck(const CchCall& call, vexlon_ip_brannoc_state* state) {
   std::vector<std::uint8_t> data(call.maxData), ack(call.maxAck);
   vexlon_ip_brannoc_CCH_outputs outputs{(call.nulls & 2) != 0 ? nullptr : data.data(),
                                         (call.nulls & 4) != 0 ? nullptr : ack.data(),
-                                        call.maxData, call.maxAck, 0, 0, 0};
+                                        call.maxData,
+                                        call.maxAck,
+                                        0,
+                                        0,
+                                        0};
   const vexlon_ip_brannoc_CCH_inputs inputs{(call.nulls & 1) != 0 ? nullptr : llr.data(),
                                             call.llrSize, call.control};
   const std::int32_t status = vexlon_ip_brannoc_CCH_bitacc_simulate(

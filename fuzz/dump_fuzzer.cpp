@@ -87,8 +87,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
       const char c = static_cast<char>(in.byte());
       name += c == '/' ? '_' : c;
     }
-    const std::uint32_t result = IUO_set_debugfn_state(
-        state, key, channel, name.data(), static_cast<std::uint32_t>(name.size()));
+    const std::uint32_t result = IUO_set_debugfn_state(state, key, channel, name.data(),
+                                                       static_cast<std::uint32_t>(name.size()));
     if (result != ((key <= 32 && channel <= 1) ? 1U : 0U)) {
       __builtin_trap();
     }

@@ -71,10 +71,29 @@ fz::SchCall schCall(const Scenario& s) {
   const tx::PuschControlFields& f = t.fields;
   fz::SchCall call;
   call.generics = vexlon_ip_brannoc_get_default_generics();
-  call.control = {f.Qcqi,   f.cqiBits, f.contentMask, f.Qack,    f.ackBits, f.Qri,
-                  f.riBits, f.Eidx,    f.Rmux,        f.cpIndex, f.Eminus,  f.Eplus,
-                  f.tbSize, 2,         f.qamIndex,    7,         3,         2,
-                  f.rv,     s.retransmission ? 0U : 1U, 0, 0, 11};
+  call.control = {f.Qcqi,
+                  f.cqiBits,
+                  f.contentMask,
+                  f.Qack,
+                  f.ackBits,
+                  f.Qri,
+                  f.riBits,
+                  f.Eidx,
+                  f.Rmux,
+                  f.cpIndex,
+                  f.Eminus,
+                  f.Eplus,
+                  f.tbSize,
+                  2,
+                  f.qamIndex,
+                  7,
+                  3,
+                  2,
+                  f.rv,
+                  s.retransmission ? 0U : 1U,
+                  0,
+                  0,
+                  11};
   call.llrSize = f.totalBits;
   call.llr = t.softValues;
   if (s.retransmission) {
@@ -122,8 +141,9 @@ int main(int argc, char** argv) {
     writeText(root / "vector", base + ".vec", brannoc::vectors::formatVector(vector));
     // The same call past each control field's limit (SCH_TAG has none), and with each
     // pointer null.
-    const std::uint32_t pastLimit[23] = {4096, 128, 16, 256, 3, 256, 3, 128, 2048, 2, 65536, 65536,
-                                         262144, 16, 3, 65536, 16, 16, 4, 2, 2, 2, 0};
+    const std::uint32_t pastLimit[23] = {4096, 128, 16,    256,   3,      256, 3, 128,
+                                         2048, 2,   65536, 65536, 262144, 16,  3, 65536,
+                                         16,   16,  4,     2,     2,      2,   0};
     for (int k = 0; k < 22; ++k) {
       fz::SchCall broken = call;
       std::uint32_t* brokenFields = &broken.control.SCH_CQI_IP_SIZE;
@@ -198,8 +218,8 @@ int main(int argc, char** argv) {
       tx::turboEncode(pattern(K, K), d);
       const std::uint32_t index = K <= 512 ? (K - 40) / 8 : 60 + (K - 528) / 16;
       out.byte(static_cast<std::uint8_t>(index));
-      out.byte(2);   // 3 iterations
-      out.byte(0);   // no null pointer
+      out.byte(2);  // 3 iterations
+      out.byte(0);  // no null pointer
       out.word(K);
       for (const tx::Bits* stream : {&d.d0, &d.d1, &d.d2}) {
         for (std::size_t i = 0; i < stream->size(); ++i) {

@@ -78,7 +78,8 @@ Link::~Link() { vexlon_ip_brannoc_destroy_state(itsState); }
 bool Link::open(std::string& error) {
   const LinkConfig& c = itsConfig;
   if (c.maxTransmissions == 0 || c.rvSequence.empty() ||
-      std::any_of(c.rvSequence.begin(), c.rvSequence.end(), [](std::uint32_t rv) { return rv > 3; })) {
+      std::any_of(c.rvSequence.begin(), c.rvSequence.end(),
+                  [](std::uint32_t rv) { return rv > 3; })) {
     error = "the redundancy versions must be 0..3 and at least one transmission is sent";
     return false;
   }
@@ -137,16 +138,35 @@ bool Link::runPusch(double snrDb, std::uint64_t seed, BlockOutcome& outcome, std
     }
     const tx::PuschControlFields& f = itsSent.fields;
     const std::array<std::vector<std::int32_t>, 3>& harqIn = itsHarqIn;
-    const vexlon_ip_brannoc_SCH_inputs in{
-        itsSent.softValues.data(),
-        t == 0 ? nullptr : harqIn[0].data(),
-        t == 0 ? nullptr : harqIn[1].data(),
-        t == 0 ? nullptr : harqIn[2].data(),
-        static_cast<std::uint32_t>(itsSent.softValues.size()),
-        harqSize,
-        {f.Qcqi, f.cqiBits, f.contentMask, f.Qack, f.ackBits, f.Qri, f.riBits, f.Eidx, f.Rmux,
-         f.cpIndex, f.Eminus, f.Eplus, f.tbSize, c.iterations, f.qamIndex, 0, (8 * t) % 10, 0,
-         f.rv, t == 0 ? 1u : 0u, 0, 0, t}};
+    const vexlon_ip_brannoc_SCH_inputs in{itsSent.softValues.data(),
+                                          t == 0 ? nullptr : harqIn[0].data(),
+                                          t == 0 ? nullptr : harqIn[1].data(),
+                                          t == 0 ? nullptr : harqIn[2].data(),
+                                          static_cast<std::uint32_t>(itsSent.softValues.size()),
+                                          harqSize,
+                                          {f.Qcqi,
+                                           f.cqiBits,
+                                           f.contentMask,
+                                           f.Qack,
+                                           f.ackBits,
+                                           f.Qri,
+                                           f.riBits,
+                                           f.Eidx,
+                                           f.Rmux,
+                                           f.cpIndex,
+                                           f.Eminus,
+                                           f.Eplus,
+                                           f.tbSize,
+                                           c.iterations,
+                                           f.qamIndex,
+                                           0,
+                                           (8 * t) % 10,
+                                           0,
+                                           f.rv,
+                                           t == 0 ? 1u : 0u,
+                                           0,
+                                           0,
+                                           t}};
     vexlon_ip_brannoc_SCH_outputs& out = itsOut.prepare(in.controlData, f.harqBufferLength);
     if (hook) {
       hook({&in, f.harqBufferLength, nullptr, &payload.transportBlock, &payload.cqi, &payload.ack,
@@ -160,19 +180,22 @@ bool Link::runPusch(double snrDb, std::uint64_t seed, BlockOutcome& outcome, std
     }
     outcome.transmissions = t + 1;
     outcome.decodedBits += c.tbSize;
-    const bool cqiWrong = c.cqiBits > 0 && (out.SCH_CQI_crc_error != 0 ||
-                                            !sameBits(itsOut.cqi.data(), out.SCH_CQI_out_size, payload.cqi));
-    const bool ackWrong = c.ackBits > 0 && !sameBits(itsOut.ack.data(), out.SCH_ACK_out_size, payload.ack);
-    const bool riWrong = c.riBits > 0 && !sameBits(itsOut.ri.data(), out.SCH_RI_out_size, payload.ri);
+    const bool cqiWrong =
+        c.cqiBits > 0 && (out.SCH_CQI_crc_error != 0 ||
+                          !sameBits(itsOut.cqi.data(), out.SCH_CQI_out_size, payload.cqi));
+    const bool ackWrong =
+        c.ackBits > 0 && !sameBits(itsOut.ack.data(), out.SCH_ACK_out_size, payload.ack);
+    const bool riWrong =
+        c.riBits > 0 && !sameBits(itsOut.ri.data(), out.SCH_RI_out_size, payload.ri);
     outcome.cqiErrors += cqiWrong;
     outcome.ackErrors += ackWrong;
     outcome.riErrors += riWrong;
     if (out.SCH_TB_crc_error == 0 && !outcome.correct) {
       // The receiver takes the block: right unless the CRC missed an error. Without a
       // transport block (control only), the control fields are the block.
-      outcome.correct = c.tbSize > 0
-                            ? sameBits(itsOut.data.data(), out.SCH_data_out_size, payload.transportBlock)
-                            : !(cqiWrong || ackWrong || riWrong);
+      outcome.correct =
+          c.tbSize > 0 ? sameBits(itsOut.data.data(), out.SCH_data_out_size, payload.transportBlock)
+                       : !(cqiWrong || ackWrong || riWrong);
       outcome.deliveredBits = outcome.correct ? c.tbSize : 0;
       if (!c.retransmitDecoded) break;
     }
@@ -189,7 +212,8 @@ bool Link::runPucch(double snrDb, std::uint64_t seed, BlockOutcome& outcome, std
   const tx::Bits cqi = randomBits(random, c.cqiBits);
   const tx::Bits ack = randomBits(random, c.ackBits);
   tx::PucchTransmission sent;
-  if (const tx::TxOutcome outcome = tx::transmitPucch(cqi, ack, c.cp, awgn(c, snrDb, mixSeed(seed, 1)), sent);
+  if (const tx::TxOutcome outcome =
+          tx::transmitPucch(cqi, ack, c.cp, awgn(c, snrDb, mixSeed(seed, 1)), sent);
       !outcome.ok()) {
     error = "the transmitter refused a PUCCH transmission: " + outcome.text;
     return false;
@@ -202,8 +226,13 @@ bool Link::runPucch(double snrDb, std::uint64_t seed, BlockOutcome& outcome, std
       sent.softValues.data(),
       static_cast<std::uint32_t>(sent.softValues.size()),
       {c.cqiBits, c.cp == tx::CyclicPrefix::Normal ? 0u : 1u, c.ackBits, 0, 0}};
-  vexlon_ip_brannoc_CCH_outputs out{decodedCqi.data(), decodedAck.data(),
-                                    static_cast<std::uint32_t>(decodedCqi.size()), 2, 0, 0, 0};
+  vexlon_ip_brannoc_CCH_outputs out{decodedCqi.data(),
+                                    decodedAck.data(),
+                                    static_cast<std::uint32_t>(decodedCqi.size()),
+                                    2,
+                                    0,
+                                    0,
+                                    0};
   if (hook) hook({nullptr, 0, &in, nullptr, &cqi, &ack, nullptr});
   const std::int32_t status =
       timed(outcome, [&] { return vexlon_ip_brannoc_CCH_bitacc_simulate(itsState, in, &out); });

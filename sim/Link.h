@@ -64,7 +64,7 @@ struct Call {
   const tx::Bits* data = nullptr;  // PUSCH only
   const tx::Bits* cqi = nullptr;
   const tx::Bits* ack = nullptr;
-  const tx::Bits* ri = nullptr;    // PUSCH only
+  const tx::Bits* ri = nullptr;  // PUSCH only
 };
 using CallHook = std::function<void(const Call&)>;
 

@@ -23,9 +23,9 @@ double PointResult::bler(std::size_t k) const {
 
 double PointResult::throughputMbps() const {
   // One transmission per 1 ms subframe: bits per ms / 1000 = Mbit/s.
-  return transmissions == 0 ? 0.0
-                            : static_cast<double>(deliveredBits) /
-                                  static_cast<double>(transmissions) / 1000.0;
+  return transmissions == 0
+             ? 0.0
+             : static_cast<double>(deliveredBits) / static_cast<double>(transmissions) / 1000.0;
 }
 
 double PointResult::decodeMbps() const {
@@ -166,9 +166,8 @@ class Scheduler {
   void queueBatch(std::size_t i) {
     PointState& state = itsPoints[i];
     state.batchStart = state.result.blocks;
-    const std::uint64_t end =
-        std::min(state.batchStart + std::max<std::uint64_t>(itsConfig.batchBlocks, 1),
-                 itsConfig.maxBlocks);
+    const std::uint64_t end = std::min(
+        state.batchStart + std::max<std::uint64_t>(itsConfig.batchBlocks, 1), itsConfig.maxBlocks);
     state.pending = end - state.batchStart;
     state.outcomes.assign(state.pending, BlockOutcome{});
     for (std::uint64_t b = state.batchStart; b < end; ++b) itsQueue.push_back({i, b});
@@ -215,8 +214,8 @@ class Scheduler {
     for (const PointState& state : itsPoints) {
       if (state.done) continue;
       for (const BlockOutcome& o : state.outcomes) {
-        counts.insert(counts.end(), {o.transmissions, o.correct ? 1U : 0U, o.cqiErrors,
-                                     o.ackErrors, o.riErrors, o.deliveredBits, o.decodedBits});
+        counts.insert(counts.end(), {o.transmissions, o.correct ? 1U : 0U, o.cqiErrors, o.ackErrors,
+                                     o.riErrors, o.deliveredBits, o.decodedBits});
         seconds.push_back(o.decodeSeconds);
       }
     }

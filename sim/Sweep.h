@@ -31,12 +31,12 @@ struct Curve {
 
 struct SweepConfig {
   std::vector<Curve> curves;
-  std::vector<double> snrDb;          // Es/N0 of the modulation symbols, per point
-  std::uint64_t maxBlocks = 2000;     // blocks per point at most
-  std::uint64_t targetErrors = 100;   // first-transmission block errors that end a point; 0: none
-  std::uint64_t batchBlocks = 100;    // blocks between two checks of the stopping rule
+  std::vector<double> snrDb;         // Es/N0 of the modulation symbols, per point
+  std::uint64_t maxBlocks = 2000;    // blocks per point at most
+  std::uint64_t targetErrors = 100;  // first-transmission block errors that end a point; 0: none
+  std::uint64_t batchBlocks = 100;   // blocks between two checks of the stopping rule
   std::uint64_t seed = 1;
-  unsigned threads = 1;               // worker threads, each with its own decoder instances
+  unsigned threads = 1;  // worker threads, each with its own decoder instances
 };
 
 // The counts of one (curve, point). All but the two timing fields are the same for every
@@ -50,9 +50,9 @@ struct PointResult {
   std::uint64_t transmissions = 0;         // sent in all
   std::uint64_t deliveredBits = 0;         // bits of the blocks decoded correctly
   std::uint64_t cqiErrors = 0, ackErrors = 0, riErrors = 0;  // per transmission carrying them
-  std::uint64_t uciTransmissions = 0;      // transmissions (each carries the configured UCI)
-  double decodeSeconds = 0;                // time in the decoder's calls (timing)
-  std::uint64_t decodedBits = 0;           // bits through the decoder (timing)
+  std::uint64_t uciTransmissions = 0;  // transmissions (each carries the configured UCI)
+  double decodeSeconds = 0;            // time in the decoder's calls (timing)
+  std::uint64_t decodedBits = 0;       // bits through the decoder (timing)
 
   double bler(std::size_t k) const;  // failedAfter[k] / blocks
   // Delivered bits per transmission time interval of 1 ms, in Mbit/s.

@@ -25,7 +25,8 @@ struct Field {
   std::uint32_t Record::*member;
 };
 
-#define BRANNOC_FIELD(Record, name) Field<Record>{#name, &Record::name}
+#define BRANNOC_FIELD(Record, name) \
+  Field<Record> { #name, &Record::name }
 
 using Generics = vexlon_ip_brannoc_generics;
 using SchControl = vexlon_ip_brannoc_SCH_controlData;
@@ -36,17 +37,17 @@ constexpr Field<Generics> kGenerics[] = {
     BRANNOC_FIELD(Generics, C_INTERLEAVER_BUFFER_SIZE), BRANNOC_FIELD(Generics, C_NUM_CQI_PU)};
 
 constexpr Field<SchControl> kSchControl[] = {
-    BRANNOC_FIELD(SchControl, SCH_CQI_IP_SIZE), BRANNOC_FIELD(SchControl, SCH_CQI_OP_SIZE),
+    BRANNOC_FIELD(SchControl, SCH_CQI_IP_SIZE),  BRANNOC_FIELD(SchControl, SCH_CQI_OP_SIZE),
     BRANNOC_FIELD(SchControl, SCH_IP_DATA_TYPE), BRANNOC_FIELD(SchControl, SCH_ACK_IP_SIZE),
-    BRANNOC_FIELD(SchControl, SCH_ACK_OP_SIZE), BRANNOC_FIELD(SchControl, SCH_RI_IP_SIZE),
-    BRANNOC_FIELD(SchControl, SCH_RI_OP_SIZE), BRANNOC_FIELD(SchControl, SCH_RM_E_IDX),
-    BRANNOC_FIELD(SchControl, SCH_CH_INT_ROWS), BRANNOC_FIELD(SchControl, SCH_CP),
-    BRANNOC_FIELD(SchControl, SCH_RM_E_MINUS), BRANNOC_FIELD(SchControl, SCH_RM_E_PLUS),
-    BRANNOC_FIELD(SchControl, SCH_TBSIZE), BRANNOC_FIELD(SchControl, SCH_TD_ITER),
-    BRANNOC_FIELD(SchControl, SCH_QAM), BRANNOC_FIELD(SchControl, SCH_USER_ID),
-    BRANNOC_FIELD(SchControl, SCH_SFRM), BRANNOC_FIELD(SchControl, SCH_HARQ_SFRM),
-    BRANNOC_FIELD(SchControl, SCH_RV), BRANNOC_FIELD(SchControl, SCH_ND),
-    BRANNOC_FIELD(SchControl, SCH_HFC), BRANNOC_FIELD(SchControl, SCH_TD_FLUSH),
+    BRANNOC_FIELD(SchControl, SCH_ACK_OP_SIZE),  BRANNOC_FIELD(SchControl, SCH_RI_IP_SIZE),
+    BRANNOC_FIELD(SchControl, SCH_RI_OP_SIZE),   BRANNOC_FIELD(SchControl, SCH_RM_E_IDX),
+    BRANNOC_FIELD(SchControl, SCH_CH_INT_ROWS),  BRANNOC_FIELD(SchControl, SCH_CP),
+    BRANNOC_FIELD(SchControl, SCH_RM_E_MINUS),   BRANNOC_FIELD(SchControl, SCH_RM_E_PLUS),
+    BRANNOC_FIELD(SchControl, SCH_TBSIZE),       BRANNOC_FIELD(SchControl, SCH_TD_ITER),
+    BRANNOC_FIELD(SchControl, SCH_QAM),          BRANNOC_FIELD(SchControl, SCH_USER_ID),
+    BRANNOC_FIELD(SchControl, SCH_SFRM),         BRANNOC_FIELD(SchControl, SCH_HARQ_SFRM),
+    BRANNOC_FIELD(SchControl, SCH_RV),           BRANNOC_FIELD(SchControl, SCH_ND),
+    BRANNOC_FIELD(SchControl, SCH_HFC),          BRANNOC_FIELD(SchControl, SCH_TD_FLUSH),
     BRANNOC_FIELD(SchControl, SCH_TAG)};
 
 constexpr Field<CchControl> kCchControl[] = {
@@ -135,8 +136,8 @@ class Reader {
                       std::to_string(seen->second.line) + ")");
         }
         std::uint32_t number = 0;
-        const std::string what = entry->kind == Kind::Scalar ? "an unsigned 32-bit value"
-                                                             : "the number of values";
+        const std::string what =
+            entry->kind == Kind::Scalar ? "an unsigned 32-bit value" : "the number of values";
         if (tokens.size() < 2 || !parseNumber(tokens[1], number)) {
           return fail("expected " + what + " after '" + std::string(entry->name) + "'" +
                       (tokens.size() < 2 ? std::string() : ", found " + quoted(tokens[1])));
@@ -167,8 +168,8 @@ class Reader {
       if (values->size() == wanted) open = nullptr;
     }
     if (open != nullptr) {
-      return fail("expected " + std::to_string(wanted - values->size()) +
-                  " more values of '" + std::string(open->name) + "' before the end of the file");
+      return fail("expected " + std::to_string(wanted - values->size()) + " more values of '" +
+                  std::string(open->name) + "' before the end of the file");
     }
     for (const Entry& entry : schema) {
       if (entry.required && items.count(entry.name) == 0) {

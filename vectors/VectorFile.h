@@ -39,9 +39,9 @@ using SoftValues = std::vector<std::int32_t>;
 // capacities of the call are the control fields' sizes, except max_harq_buffer_size.
 struct SharedCall {
   vexlon_ip_brannoc_SCH_controlData control{};
-  std::uint32_t maxHarqBufferSize = 0;  // sum over the code blocks of K + 4
-  SoftValues llr;                       // tb_llr
-  std::array<SoftValues, 3> harq;       // sys, p0, p1 input HARQ buffers; empty for new data
+  std::uint32_t maxHarqBufferSize = 0;     // sum over the code blocks of K + 4
+  SoftValues llr;                          // tb_llr
+  std::array<SoftValues, 3> harq;          // sys, p0, p1 input HARQ buffers; empty for new data
   std::optional<Bits> data, cqi, ack, ri;  // expected SCH_data_out, SCH_CQI_out, ...
 };
 

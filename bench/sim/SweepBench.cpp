@@ -44,12 +44,37 @@ void plainLoop(benchmark::State& state) {
       break;
     }
     const brannoc::tx::PuschControlFields& f = sent.fields;
-    const vexlon_ip_brannoc_SCH_inputs inputs{
-        sent.softValues.data(), nullptr, nullptr, nullptr,
-        static_cast<std::uint32_t>(sent.softValues.size()), 0,
-        {0, 0, f.contentMask, 0, 0, 0, 0, f.Eidx, f.Rmux, f.cpIndex, f.Eminus, f.Eplus, f.tbSize,
-         link.iterations, f.qamIndex, 0, 0, 0, 0, 1, 0, 0, 0}};
-    vexlon_ip_brannoc_SCH_outputs& outputs = buffers.prepare(inputs.controlData, f.harqBufferLength);
+    const vexlon_ip_brannoc_SCH_inputs inputs{sent.softValues.data(),
+                                              nullptr,
+                                              nullptr,
+                                              nullptr,
+                                              static_cast<std::uint32_t>(sent.softValues.size()),
+                                              0,
+                                              {0,
+                                               0,
+                                               f.contentMask,
+                                               0,
+                                               0,
+                                               0,
+                                               0,
+                                               f.Eidx,
+                                               f.Rmux,
+                                               f.cpIndex,
+                                               f.Eminus,
+                                               f.Eplus,
+                                               f.tbSize,
+                                               link.iterations,
+                                               f.qamIndex,
+                                               0,
+                                               0,
+                                               0,
+                                               0,
+                                               1,
+                                               0,
+                                               0,
+                                               0}};
+    vexlon_ip_brannoc_SCH_outputs& outputs =
+        buffers.prepare(inputs.controlData, f.harqBufferLength);
     if (vexlon_ip_brannoc_SCH_bitacc_simulate(instance, inputs, &outputs) != 0 ||
         outputs.SCH_TB_crc_error != 0) {
       state.SkipWithError("the block did not decode");
@@ -57,8 +82,8 @@ void plainLoop(benchmark::State& state) {
     }
   }
   vexlon_ip_brannoc_destroy_state(instance);
-  state.counters["blocks/s"] = benchmark::Counter(static_cast<double>(state.iterations()),
-                                                  benchmark::Counter::kIsRate);
+  state.counters["blocks/s"] =
+      benchmark::Counter(static_cast<double>(state.iterations()), benchmark::Counter::kIsRate);
 }
 BENCHMARK(plainLoop)->Unit(benchmark::kMillisecond)->UseRealTime();
 
@@ -77,8 +102,8 @@ void engine(benchmark::State& state) {
       break;
     }
   }
-  state.counters["blocks/s"] = benchmark::Counter(
-      static_cast<double>(state.iterations() * kBlocks), benchmark::Counter::kIsRate);
+  state.counters["blocks/s"] = benchmark::Counter(static_cast<double>(state.iterations() * kBlocks),
+                                                  benchmark::Counter::kIsRate);
 }
 BENCHMARK(engine)->ArgName("threads")->Arg(1)->Arg(2)->Unit(benchmark::kMillisecond)->UseRealTime();
 

@@ -106,8 +106,7 @@ class Decoder {
  public:
   Decoder(std::uint32_t numPU, std::uint32_t algorithm, std::uint32_t interleaverBufferSize,
           std::uint32_t numCqiPU) {
-    const vexlon_ip_brannoc_generics generics{numPU, algorithm, interleaverBufferSize,
-                                              numCqiPU};
+    const vexlon_ip_brannoc_generics generics{numPU, algorithm, interleaverBufferSize, numCqiPU};
     std::string lines;
     {
       CaptureLines capture(lines);
@@ -131,8 +130,8 @@ class Decoder {
                       const std::optional<Int32Array>& p1, std::uint32_t harqSize) {
     const vexlon_ip_brannoc_SCH_controlData control = schControl(fields);
     const vexlon_ip_brannoc_SCH_inputs inputs{
-        llr.size() == 0 ? nullptr : llr.data(), softPointer(sys), softPointer(p0),
-        softPointer(p1), static_cast<std::uint32_t>(llr.size()), harqSize, control};
+        llr.size() == 0 ? nullptr : llr.data(), softPointer(sys), softPointer(p0), softPointer(p1),
+        static_cast<std::uint32_t>(llr.size()), harqSize,         control};
     const std::uint32_t harq = std::max<std::uint32_t>(harqCapacity(control.SCH_TBSIZE), 1);
     ByteArray data(std::max<std::uint32_t>(control.SCH_TBSIZE, 1));
     ByteArray ack(std::max<std::uint32_t>(control.SCH_ACK_OP_SIZE, 1));
@@ -167,8 +166,7 @@ class Decoder {
         status, lines, data[py::slice(0, outputs.SCH_data_out_size, 1)],
         cqi[py::slice(0, outputs.SCH_CQI_out_size, 1)],
         ack[py::slice(0, outputs.SCH_ACK_out_size, 1)],
-        ri[py::slice(0, outputs.SCH_RI_out_size, 1)],
-        cw[py::slice(0, outputs.CW_CRC_out_size, 1)],
+        ri[py::slice(0, outputs.SCH_RI_out_size, 1)], cw[py::slice(0, outputs.CW_CRC_out_size, 1)],
         harqOut[py::make_tuple(py::slice(0, 3, 1), harqUsed)], outputs.SCH_TB_crc_error,
         outputs.SCH_CQI_crc_error, outputs.SCH_ACK_parity_error, outputs.SCH_RI_parity_error,
         outputs.SCH_TAG_out);
@@ -232,9 +230,9 @@ tx::Bits toBits(const ByteArray& bits) { return tx::Bits(bits.data(), bits.data(
 py::tuple transmitPusch(std::uint32_t numPrb, std::uint32_t Qm, bool extended,
                         const ByteArray& transportBlock, std::uint32_t rv, const ByteArray& cqi,
                         const ByteArray& ack, const ByteArray& ri,
-                        const std::array<std::uint32_t, 3>& betaIndices, std::uint32_t initialNumPrb,
-                        bool awgn, double esN0Db, std::uint64_t seed, double llrScale,
-                        std::int32_t idealAmplitude) {
+                        const std::array<std::uint32_t, 3>& betaIndices,
+                        std::uint32_t initialNumPrb, bool awgn, double esN0Db, std::uint64_t seed,
+                        double llrScale, std::int32_t idealAmplitude) {
   tx::PuschParameters p;
   p.numPrb = numPrb;
   p.Qm = Qm;
@@ -253,9 +251,8 @@ py::tuple transmitPusch(std::uint32_t numPrb, std::uint32_t Qm, bool extended,
   tx::TxOutcome outcome;
   {
     py::gil_scoped_release release;
-    outcome = tx::transmitPusch(p, payload, channelSettings(awgn, esN0Db, seed, llrScale,
-                                                            idealAmplitude),
-                                sent);
+    outcome = tx::transmitPusch(
+        p, payload, channelSettings(awgn, esN0Db, seed, llrScale, idealAmplitude), sent);
   }
   if (!outcome.ok()) {
     throw py::value_error(outcome.text);

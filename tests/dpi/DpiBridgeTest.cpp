@@ -37,7 +37,8 @@ namespace tx = brannoc::tx;
 
 std::vector<std::uint8_t> bitsOf(void* h, int which) {
   std::vector<std::uint8_t> bits;
-  for (int i = 0; i < brannoc_dpi_sch_size(h, which); ++i) bits.push_back(brannoc_dpi_sch_bit(h, which, i));
+  for (int i = 0; i < brannoc_dpi_sch_size(h, which); ++i)
+    bits.push_back(brannoc_dpi_sch_bit(h, which, i));
   return bits;
 }
 
@@ -59,9 +60,29 @@ TEST(DpiBridge, RetransmissionsKeepTheirHarqBuffersInTheHandle) {
     tx::PuschTransmission t;
     ASSERT_TRUE(tx::transmitPusch(p, {tb, {1, 0, 1, 1, 0}, {}, {}}, channel, t).ok());
     const tx::PuschControlFields& f = t.fields;
-    const std::uint32_t fields[23] = {f.Qcqi, f.cqiBits, f.contentMask, 0, 0, 0, 0, f.Eidx, f.Rmux,
-                                      f.cpIndex, f.Eminus, f.Eplus, f.tbSize, 8, f.qamIndex, 1, 0,
-                                      0, f.rv, n == 0 ? 1u : 0u, 0, 0, 77};
+    const std::uint32_t fields[23] = {f.Qcqi,
+                                      f.cqiBits,
+                                      f.contentMask,
+                                      0,
+                                      0,
+                                      0,
+                                      0,
+                                      f.Eidx,
+                                      f.Rmux,
+                                      f.cpIndex,
+                                      f.Eminus,
+                                      f.Eplus,
+                                      f.tbSize,
+                                      8,
+                                      f.qamIndex,
+                                      1,
+                                      0,
+                                      0,
+                                      f.rv,
+                                      n == 0 ? 1u : 0u,
+                                      0,
+                                      0,
+                                      77};
     brannoc_dpi_sch_begin(h);
     for (int k = 0; k < 23; ++k) brannoc_dpi_sch_set_field(h, k, fields[k]);
     if (n > 0) brannoc_dpi_sch_keep_harq(h);  // what the last call returned
@@ -97,7 +118,8 @@ TEST(DpiBridge, RefusesNullHandlesBadIndicesAndOversizedCalls) {
   EXPECT_EQ(brannoc_dpi_sch_harq(h, 3, 0), 0);
   // A PUCCH call, then more soft values than any call takes: refused as uncacheable.
   tx::PucchTransmission t;
-  ASSERT_TRUE(tx::transmitPucch(tx::Bits{1, 0, 1}, tx::Bits{1}, tx::CyclicPrefix::Normal, {}, t).ok());
+  ASSERT_TRUE(
+      tx::transmitPucch(tx::Bits{1, 0, 1}, tx::Bits{1}, tx::CyclicPrefix::Normal, {}, t).ok());
   brannoc_dpi_cch_begin(h);
   const unsigned fields[5] = {3, 0, 1, 9, 4};
   for (int k = 0; k < 5; ++k) brannoc_dpi_cch_set_field(h, k, fields[k]);

@@ -14,8 +14,8 @@ TEST(Mcs, TablesGiveModulationAndTransportBlockSize) {
     std::uint32_t iMcs, numPrb;
     std::optional<std::uint32_t> Qm, tbs;
   } cases[] = {
-      {0, 1, 2, 16},        {10, 6, 2, 1032},     {11, 6, 4, 1032}, {20, 50, 4, 21384},
-      {21, 50, 6, 21384},   {28, 110, 6, 75376},  {29, 6, {}, {}},  {10, 111, 2, {}},
+      {0, 1, 2, 16},      {10, 6, 2, 1032},    {11, 6, 4, 1032}, {20, 50, 4, 21384},
+      {21, 50, 6, 21384}, {28, 110, 6, 75376}, {29, 6, {}, {}},  {10, 111, 2, {}},
   };
   for (const auto& c : cases) {
     const auto mcs = uplinkMcs(c.iMcs);

@@ -48,7 +48,8 @@ TEST(VectorFile, WrittenFilesReadBackAndCutsAreRefused) {
   v.shared.control.SCH_TAG = 0xFFFFFFFF;
   v.shared.maxHarqBufferSize = 3;
   v.shared.llr.assign(40, -128);
-  v.shared.harq = {SoftValues{1, 2, 3}, SoftValues{-1, -2, -3}, SoftValues{127, 0, -2147483647 - 1}};
+  v.shared.harq = {SoftValues{1, 2, 3}, SoftValues{-1, -2, -3},
+                   SoftValues{127, 0, -2147483647 - 1}};
   v.shared.data = Bits(70, 1);
   v.shared.cqi = Bits{};
   v.shared.ri = Bits{1, 0};
@@ -73,17 +74,26 @@ TEST(VectorFile, MalformedLinesNameTheLineAndWhatWasExpected) {
       {"CCH_CP 0", "CCH_CP x", "8: expected an unsigned 32-bit value after 'CCH_CP', found 'x'"},
       {"CCH_CP 0", "CCH_CP", "8: expected an unsigned 32-bit value after 'CCH_CP'"},
       {"CCH_CP 0", "CCH_CP 0 1", "8: expected the end of the line after 'CCH_CP 0', found '1'"},
-      {"CCH_CP 0", "CCH_CP 4294967296", "8: expected an unsigned 32-bit value after 'CCH_CP', found '4294967296'"},
+      {"CCH_CP 0", "CCH_CP 4294967296",
+       "8: expected an unsigned 32-bit value after 'CCH_CP', found '4294967296'"},
       {"CCH_CP 0", "SCH_CP 0", "8: expected a field name of a pucch vector, found 'SCH_CP'"},
       {"CCH_TAG 0", "CCH_CP 1", "11: 'CCH_CP' given a second time (first on line 8)"},
-      {"CCH_TAG 0\n", "", "15: expected 'CCH_TAG' before the end of the file (a pucch vector gives every field)"},
-      {"llr 4", "llr 4000000000", "12: expected at most 1048576 values of 'llr', found a count of 4000000000"},
-      {"1 -2", "1 99999999999", "13: expected 3 more signed 32-bit soft values of 'llr' (4 in all), found '99999999999'"},
-      {"3 -4", "3", "15: expected 1 more signed 32-bit soft values of 'llr' (4 in all), found 'expect.CCH_data_out'"},
+      {"CCH_TAG 0\n", "",
+       "15: expected 'CCH_TAG' before the end of the file (a pucch vector gives every field)"},
+      {"llr 4", "llr 4000000000",
+       "12: expected at most 1048576 values of 'llr', found a count of 4000000000"},
+      {"1 -2", "1 99999999999",
+       "13: expected 3 more signed 32-bit soft values of 'llr' (4 in all), found '99999999999'"},
+      {"3 -4", "3",
+       "15: expected 1 more signed 32-bit soft values of 'llr' (4 in all), found "
+       "'expect.CCH_data_out'"},
       {"3 -4", "3 -4 5", "14: expected no more soft values of 'llr' (4 in all), found '5'"},
-      {"0110", "0120", "16: expected 2 more bits of 'expect.CCH_data_out' (4 in all), found '0120'"},
-      {"0110", "01101", "16: expected no more bits of 'expect.CCH_data_out' (4 in all), found '01101'"},
-      {"0110", "011", "16: expected 1 more values of 'expect.CCH_data_out' before the end of the file"},
+      {"0110", "0120",
+       "16: expected 2 more bits of 'expect.CCH_data_out' (4 in all), found '0120'"},
+      {"0110", "01101",
+       "16: expected no more bits of 'expect.CCH_data_out' (4 in all), found '01101'"},
+      {"0110", "011",
+       "16: expected 1 more values of 'expect.CCH_data_out' before the end of the file"},
   };
   for (const auto& c : cases) {
     std::string text = kPucch;

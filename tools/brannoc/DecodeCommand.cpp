@@ -32,7 +32,8 @@ class Decoder {
 
   vexlon_ip_brannoc_state* get(const vexlon_ip_brannoc_generics& g) {
     const auto same = [&] {
-      return g.C_NUM_PU == itsGenerics.C_NUM_PU && g.C_ALGORITHM_TYPE == itsGenerics.C_ALGORITHM_TYPE &&
+      return g.C_NUM_PU == itsGenerics.C_NUM_PU &&
+             g.C_ALGORITHM_TYPE == itsGenerics.C_ALGORITHM_TYPE &&
              g.C_INTERLEAVER_BUFFER_SIZE == itsGenerics.C_INTERLEAVER_BUFFER_SIZE &&
              g.C_NUM_CQI_PU == itsGenerics.C_NUM_CQI_PU;
     };
@@ -57,7 +58,8 @@ std::uint32_t capacity(const std::vector<T>& v) {
 // Compares one result with its expectation; adds its name to wrong when they differ.
 void check(const char* name, const std::optional<vectors::Bits>& expected, const std::uint8_t* got,
            std::uint32_t size, std::vector<std::string>& wrong) {
-  if (expected && !(expected->size() == size && std::equal(expected->begin(), expected->end(), got))) {
+  if (expected &&
+      !(expected->size() == size && std::equal(expected->begin(), expected->end(), got))) {
     wrong.push_back(name);
   }
 }
@@ -72,17 +74,23 @@ struct Verdict {
 Verdict decodeShared(vexlon_ip_brannoc_state* state, const vectors::SharedCall& call) {
   const vexlon_ip_brannoc_SCH_controlData& c = call.control;
   const auto in = [](const vectors::SoftValues& v) { return v.empty() ? nullptr : v.data(); };
-  const vexlon_ip_brannoc_SCH_inputs inputs{in(call.llr), in(call.harq[0]), in(call.harq[1]),
-                                            in(call.harq[2]), capacity(call.llr),
-                                            capacity(call.harq[0]), c};
+  const vexlon_ip_brannoc_SCH_inputs inputs{in(call.llr),
+                                            in(call.harq[0]),
+                                            in(call.harq[1]),
+                                            in(call.harq[2]),
+                                            capacity(call.llr),
+                                            capacity(call.harq[0]),
+                                            c};
   sim::SharedOutputs buffers;
   vexlon_ip_brannoc_SCH_outputs& out = buffers.prepare(c, call.maxHarqBufferSize);
   Verdict v;
   v.status = vexlon_ip_brannoc_SCH_bitacc_simulate(state, inputs, &out);
   v.output = vectors::formatSharedOutput(v.status, out);
-  v.summary = fmt::format("pusch tbs {} rv {}{}", c.SCH_TBSIZE, c.SCH_RV, c.SCH_ND ? "" : " (combined)");
+  v.summary =
+      fmt::format("pusch tbs {} rv {}{}", c.SCH_TBSIZE, c.SCH_RV, c.SCH_ND ? "" : " (combined)");
   if (v.status != 0) return v;
-  if (call.data && !call.data->empty() && out.SCH_TB_crc_error != 0) v.wrong.push_back("transport-block CRC");
+  if (call.data && !call.data->empty() && out.SCH_TB_crc_error != 0)
+    v.wrong.push_back("transport-block CRC");
   check("data", call.data, buffers.data.data(), out.SCH_data_out_size, v.wrong);
   check("CQI", call.cqi, buffers.cqi.data(), out.SCH_CQI_out_size, v.wrong);
   check("ACK", call.ack, buffers.ack.data(), out.SCH_ACK_out_size, v.wrong);
@@ -99,7 +107,8 @@ Verdict decodeControl(vexlon_ip_brannoc_state* state, const vectors::ControlCall
   Verdict v;
   v.status = vexlon_ip_brannoc_CCH_bitacc_simulate(state, inputs, &out);
   v.output = vectors::formatControlOutput(v.status, out);
-  v.summary = fmt::format("pucch cqi {} ack {}", call.control.CCH_UCI_OP_SIZE, call.control.CCH_ACK_OP_SIZE);
+  v.summary = fmt::format("pucch cqi {} ack {}", call.control.CCH_UCI_OP_SIZE,
+                          call.control.CCH_ACK_OP_SIZE);
   if (v.status != 0) return v;
   check("CQI", call.cqi, cqi.data(), out.CCH_data_out_size, v.wrong);
   check("ACK", call.ack, ack.data(), out.CCH_ACK_out_size, v.wrong);
@@ -203,7 +212,8 @@ int runDecode(const DecodeOptions& o) {
       IUO_set_debugfn_state(state, key, shared ? 0 : 1, dumpName.data(),
                             static_cast<std::uint32_t>(dumpName.size()));
     }
-    const Verdict v = shared ? decodeShared(state, vector.shared) : decodeControl(state, vector.control);
+    const Verdict v =
+        shared ? decodeShared(state, vector.shared) : decodeControl(state, vector.control);
     if (!o.out.empty()) {
       const fs::path out = fs::path(o.out) / (names[n] + ".out");
       if (const std::string error = vectors::writeTextFile(out, v.output); !error.empty()) {
@@ -214,15 +224,16 @@ int runDecode(const DecodeOptions& o) {
       fmt::print("FAILED {}: {}, status {}\n", file.string(), v.summary, v.status);
       ++failed;
     } else if (!v.wrong.empty()) {
-      fmt::print("MISMATCH {}: {}, differs: {}\n", file.string(), v.summary, fmt::join(v.wrong, ", "));
+      fmt::print("MISMATCH {}: {}, differs: {}\n", file.string(), v.summary,
+                 fmt::join(v.wrong, ", "));
       ++mismatched;
     } else {
       fmt::print("PASS {}: {}\n", file.string(), v.summary);
       ++passed;
     }
   }
-  fmt::print("{} vectors: {} passed, {} mismatched, {} failed, {} unreadable\n", files.size(), passed,
-             mismatched, failed, unreadable);
+  fmt::print("{} vectors: {} passed, {} mismatched, {} failed, {} unreadable\n", files.size(),
+             passed, mismatched, failed, unreadable);
   return passed == files.size() ? 0 : 1;
 }
 
@@ -235,19 +246,19 @@ void addDecodeCommand(CLI::App& app, int& status, const Processes& processes) {
       "Decode vector files through the C interface and compare the results with the expected "
       "ones: one line per file and a summary; the exit status is 0 only when every file "
       "passed.");
-  decode->add_option("paths", options->paths, "vector files, or folders of .vec files")
-      ->required();
-  decode->add_option("-o,--out", options->out, "folder for the output files (<name>.out; files of one name in different folders: "
-                     "<folder>_<name>.out)");
+  decode->add_option("paths", options->paths, "vector files, or folders of .vec files")->required();
+  decode->add_option(
+      "-o,--out", options->out,
+      "folder for the output files (<name>.out; files of one name in different folders: "
+      "<folder>_<name>.out)");
   auto* dump = decode->add_option("--dump", options->dump,
                                   "switch debug dumps on, into files <PREFIX><name>-<piece>.log");
   decode->add_option("--keys", options->keys, "dump keys 0..32, or all")
       ->delimiter(',')
       ->needs(dump)
       ->capture_default_str();
-  decode->callback([options, &status, &processes] {
-    status = processes.rank() == 0 ? runDecode(*options) : 0;
-  });
+  decode->callback(
+      [options, &status, &processes] { status = processes.rank() == 0 ? runDecode(*options) : 0; });
 }
 
 }  // namespace brannoc::tool

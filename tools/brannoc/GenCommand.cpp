@@ -67,8 +67,9 @@ int runGen(const GenOptions& o) {
   config.retransmitDecoded = true;
   const bool oneFile = fs::path(o.out).extension() == ".vec";
   if (oneFile && (o.blocks != 1 || config.maxTransmissions != 1)) {
-    fmt::print(stderr, "brannoc gen: a single .vec file holds one transmission: give a folder, "
-                       "or --blocks 1 --max-tx 1\n");
+    fmt::print(stderr,
+               "brannoc gen: a single .vec file holds one transmission: give a folder, "
+               "or --blocks 1 --max-tx 1\n");
     return 2;
   }
   sim::Link link(config);
@@ -82,16 +83,19 @@ int runGen(const GenOptions& o) {
   for (std::uint64_t b = 0; b < o.blocks && error.empty(); ++b) {
     std::uint32_t t = 0;
     const auto write = [&](const sim::Call& call) {
-      const fs::path path =
-          oneFile ? fs::path(o.out)
-          : config.channel == sim::Channel::Pusch ? fs::path(o.out) / fmt::format("b{:04}-t{}.vec", b, ++t)
-                                                  : fs::path(o.out) / fmt::format("b{:04}.vec", b);
-      if (error.empty()) error = vectors::writeTextFile(path, vectors::formatVector(vectorOf(call, config.generics)));
+      const fs::path path = oneFile ? fs::path(o.out)
+                            : config.channel == sim::Channel::Pusch
+                                ? fs::path(o.out) / fmt::format("b{:04}-t{}.vec", b, ++t)
+                                : fs::path(o.out) / fmt::format("b{:04}.vec", b);
+      if (error.empty())
+        error =
+            vectors::writeTextFile(path, vectors::formatVector(vectorOf(call, config.generics)));
       written += error.empty();
     };
     sim::BlockOutcome outcome;
     std::string failure;
-    if (!link.runBlock(o.snr, sim::blockSeed(o.seed, 0, b), outcome, failure, write) && error.empty()) {
+    if (!link.runBlock(o.snr, sim::blockSeed(o.seed, 0, b), outcome, failure, write) &&
+        error.empty()) {
       error = failure;
     }
   }
@@ -122,9 +126,8 @@ void addGenCommand(CLI::App& app, int& status, const Processes& processes) {
   gen->add_option("-o,--out", options->out,
                   "folder for the files (b0000-t1.vec ...), or one .vec file for one call")
       ->required();
-  gen->callback([options, &status, &processes] {
-    status = processes.rank() == 0 ? runGen(*options) : 0;
-  });
+  gen->callback(
+      [options, &status, &processes] { status = processes.rank() == 0 ? runGen(*options) : 0; });
 }
 
 }  // namespace brannoc::tool

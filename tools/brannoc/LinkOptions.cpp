@@ -29,7 +29,10 @@ auto number(Set set) {
 void LinkOptions::add(CLI::App& command) {
   const auto list = [&](const std::string& name, std::vector<std::string>& values,
                         const std::string& help) {
-    command.add_option(name, values, help)->delimiter(',')->type_name("LIST")->capture_default_str();
+    command.add_option(name, values, help)
+        ->delimiter(',')
+        ->type_name("LIST")
+        ->capture_default_str();
   };
   command.add_option("--channel", itsChannel, "pusch, or pucch (format 2 CQI with ACK)")
       ->check(CLI::IsMember({"pusch", "pucch"}))
@@ -57,8 +60,9 @@ void LinkOptions::add(CLI::App& command) {
   list("--cqi", itsCqi, "CQI bits per transmission (PUSCH 0..127, PUCCH 0..13)");
   list("--ack", itsAck, "HARQ-ACK bits per transmission, 0..2");
   list("--ri", itsRi, "RI bits per transmission, 0..2 (PUSCH)");
-  command.add_option("--llr-scale", itsLlrScale,
-                     "soft value = round(32 * scale * LLR), saturated to -128..127")
+  command
+      .add_option("--llr-scale", itsLlrScale,
+                  "soft value = round(32 * scale * LLR), saturated to -128..127")
       ->check(CLI::PositiveNumber)
       ->capture_default_str();
 }
@@ -69,8 +73,9 @@ std::vector<LinkOptions::Dimension> LinkOptions::dimensions() const {
     return number([field](std::uint32_t v, D& d) { return (d.link.generics.*field = v, true); });
   };
   const auto within = [](std::uint32_t sim::LinkConfig::*field, std::uint32_t least,
-                          std::uint32_t most) {
-    return number([=](std::uint32_t v, D& d) { return (d.link.*field = v, v >= least && v <= most); });
+                         std::uint32_t most) {
+    return number(
+        [=](std::uint32_t v, D& d) { return (d.link.*field = v, v >= least && v <= most); });
   };
   return {
       {"prb", &itsPrb, within(&sim::LinkConfig::numPrb, 1, 110)},
@@ -95,8 +100,9 @@ std::vector<LinkOptions::Dimension> LinkOptions::dimensions() const {
          }
          return !v.empty();
        }},
-      {"max-tx", &itsMaxTx,
-       number([](std::uint32_t v, D& d) { return (d.link.maxTransmissions = v, v >= 1 && v <= 16); })},
+      {"max-tx", &itsMaxTx, number([](std::uint32_t v, D& d) {
+         return (d.link.maxTransmissions = v, v >= 1 && v <= 16);
+       })},
       {"iterations", &itsIterations, within(&sim::LinkConfig::iterations, 1, 15)},
       {"pu", &itsPu, generic(&vexlon_ip_brannoc_generics::C_NUM_PU)},
       {"algorithm", &itsAlgorithm, generic(&vexlon_ip_brannoc_generics::C_ALGORITHM_TYPE)},
@@ -111,8 +117,9 @@ bool LinkOptions::curves(std::vector<sim::Curve>& curves, std::string& error) co
   const bool pucch = itsChannel == "pucch";
   std::vector<Dimension> dims = dimensions();
   std::erase_if(dims, [&](const Dimension& d) {
-    if (pucch) return d.name == "prb" || d.name == "modulation" || d.name == "mcs" ||
-                      d.name == "tbs" || d.name == "rv" || d.name == "max-tx" || d.name == "ri";
+    if (pucch)
+      return d.name == "prb" || d.name == "modulation" || d.name == "mcs" || d.name == "tbs" ||
+             d.name == "rv" || d.name == "max-tx" || d.name == "ri";
     return d.name == (itsTbs.empty() ? "modulation" : "mcs") || d.values->empty();
   });
   curves.clear();
@@ -128,7 +135,8 @@ bool LinkOptions::curves(std::vector<sim::Curve>& curves, std::string& error) co
         error = "--" + dims[i].name + ": '" + value + "' is not a value it takes";
         return false;
       }
-      if (dims[i].values->size() > 1) label += (label.empty() ? "" : " ") + dims[i].name + "=" + value;
+      if (dims[i].values->size() > 1)
+        label += (label.empty() ? "" : " ") + dims[i].name + "=" + value;
     }
     if (draft.mcs >= 0) {
       const auto mcs = sim::uplinkMcs(static_cast<std::uint32_t>(draft.mcs));

@@ -6,7 +6,6 @@
 #define BRANNOC_TOOLS_LINKOPTIONS_H
 
 #include <CLI/CLI.hpp>
-
 #include <functional>
 #include <string>
 #include <vector>

@@ -18,10 +18,10 @@ namespace {
 constexpr int kMessageBytes = 1024;
 
 void sumAcross(std::vector<std::uint64_t>& counts, std::vector<double>& seconds) {
-  MPI_Allreduce(MPI_IN_PLACE, counts.data(), static_cast<int>(counts.size()), MPI_UINT64_T,
-                MPI_SUM, MPI_COMM_WORLD);
-  MPI_Allreduce(MPI_IN_PLACE, seconds.data(), static_cast<int>(seconds.size()), MPI_DOUBLE,
-                MPI_SUM, MPI_COMM_WORLD);
+  MPI_Allreduce(MPI_IN_PLACE, counts.data(), static_cast<int>(counts.size()), MPI_UINT64_T, MPI_SUM,
+                MPI_COMM_WORLD);
+  MPI_Allreduce(MPI_IN_PLACE, seconds.data(), static_cast<int>(seconds.size()), MPI_DOUBLE, MPI_SUM,
+                MPI_COMM_WORLD);
 }
 
 // The error text of the lowest rank that has one, broadcast from it.
@@ -49,8 +49,7 @@ Processes::Processes(int& argc, char**& argv) {
   // Worker threads make the exchange one at a time, from whichever finishes a round.
   const bool launched = std::getenv("OMPI_COMM_WORLD_SIZE") != nullptr ||
                         std::getenv("PMIX_RANK") != nullptr || std::getenv("PMI_RANK") != nullptr;
-  if (launched &&
-      MPI_Init_thread(&argc, &argv, MPI_THREAD_SERIALIZED, &provided) == MPI_SUCCESS) {
+  if (launched && MPI_Init_thread(&argc, &argv, MPI_THREAD_SERIALIZED, &provided) == MPI_SUCCESS) {
     itsStarted = true;
     int rank = 0, ranks = 1;
     MPI_Comm_rank(MPI_COMM_WORLD, &rank);

@@ -38,9 +38,9 @@ void ProgressBar::update(double fraction) {
   fraction = std::clamp(fraction, 0.0, 1.0);
   const double elapsed = std::chrono::duration<double>(now - itsStart).count();
   const int filled = static_cast<int>(fraction * kWidth);
-  const std::string bar = std::string(static_cast<std::size_t>(filled), '=') +
-                          (filled < kWidth ? ">" : "") +
-                          std::string(static_cast<std::size_t>(std::max(kWidth - filled - 1, 0)), ' ');
+  const std::string bar =
+      std::string(static_cast<std::size_t>(filled), '=') + (filled < kWidth ? ">" : "") +
+      std::string(static_cast<std::size_t>(std::max(kWidth - filled - 1, 0)), ' ');
   const std::string left =
       fraction > 0.01 ? "about " + clock(elapsed * (1 - fraction) / fraction) + " left" : "";
   fmt::print(stderr, "\r[{}] {:3.0f}%  {} elapsed, {:<20}", bar, 100 * fraction, clock(elapsed),

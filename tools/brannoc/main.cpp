@@ -16,8 +16,9 @@ int main(int argc, char** argv) {
     return 2;
   }
   try {
-    CLI::App app{"brannoc: link-level simulation and test vectors for the LTE uplink channel "
-                 "decoder model"};
+    CLI::App app{
+        "brannoc: link-level simulation and test vectors for the LTE uplink channel "
+        "decoder model"};
     app.set_version_flag("--version", "brannoc " BRANNOC_VERSION);
     app.require_subcommand(1);
     int status = 0;

@@ -18,6 +18,7 @@
 // frame is the same whichever thread decodes it. A point stops once it has the requested
 // number of frame errors or the frame cap, and counts the frames in order up to that point, so
 // that its row does not depend on the threads or the batch size.
+#include <CLI/CLI.hpp>
 #include <algorithm>
 #include <atomic>
 #include <cmath>
@@ -28,8 +29,6 @@
 #include <string>
 #include <thread>
 #include <vector>
-
-#include <CLI/CLI.hpp>
 
 #include "tx/SoftChannel.h"
 #include "tx/TurboEncoder.h"
